@@ -1,0 +1,63 @@
+// Test support: a private file tree over /var and /usr/share for each case,
+// so that vell's fixed absolute paths can be exercised without touching the
+// host. Nothing here is used by vell itself.
+#ifndef VELL_TESTING_SANDBOX_H_
+#define VELL_TESTING_SANDBOX_H_
+
+#include <functional>
+#include <initializer_list>
+#include <string>
+#include <vector>
+
+namespace vell::testing {
+
+/// Fresh, empty tmpfs over /var and /usr/share for the object's lifetime.
+/// The first sandbox of a process moves the process into a private mount
+/// namespace (plus a user namespace when not root), and leaves read-only
+/// tmpfs guards beneath, so a stray write can never reach the host. Throws
+/// std::runtime_error, failing the test, when any of that is impossible.
+class sandbox {
+ public:
+  sandbox();
+  ~sandbox();
+  sandbox(const sandbox&) = delete;
+  sandbox& operator=(const sandbox&) = delete;
+
+  /// Creates entries, parents as needed, one per string:
+  ///   "/a/dir/"            a directory (mode 0755)
+  ///   "/a/link -> target"  a symbolic link
+  ///   "/a/file = text"     a file holding the rest verbatim (mode 0644)
+  ///   "/a/file [0640] = text", "/a/dir/ [0700]"  the same with a mode
+  static void lay_out(std::initializer_list<std::string> entries);
+};
+
+/// What stands at `path`, in the notation of lay_out: "-> target",
+/// "= content", "/" for a directory, "absent" when nothing does.
+std::string show(const std::string& path);
+
+/// Every entry below /var and /usr/share, one sorted line each, with link
+/// targets and file contents: two equal snapshots mean an unchanged tree.
+std::string snapshot();
+
+struct run_result {
+  int status;  // exit status, or 128 + signal number
+  std::vector<std::string> messages;  // stderr lines without "vell: "
+};
+
+/// Runs the real vell binary with no arguments and an empty environment.
+/// A run that takes over 20 seconds is killed by SIGALRM.
+run_result run_vell();
+
+/// Runs `fn` in this process and returns what it printed on stderr, line by
+/// line without the "vell: " prefix. Exceptions from `fn` are passed on
+/// after stderr is restored.
+std::vector<std::string> messages_of(const std::function<void()>& fn);
+
+/// Compares printed lines with expected ones. An expected line ending in
+/// ": *" accepts any error text after that point; the others must be exact.
+void expect_messages(const std::vector<std::string>& got,
+                     const std::vector<std::string>& want);
+
+}  // namespace vell::testing
+
+#endif  // VELL_TESTING_SANDBOX_H_
