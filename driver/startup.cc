@@ -1,16 +1,53 @@
 #include "driver/startup.h"
 
-#include <cstdio>
+#include <err.h>
 
+#include <cstdio>
+#include <string>
+
+#include "dataset/dataset.h"
+#include "dataset/links.h"
 #include "housekeeping/localtime.h"
 
 namespace vell {
+namespace {
+
+// Fallback B: an unreadable zoneinfo link sends the links back to the system
+// partition, and the start goes on with the system data as current.
+std::string current_path_or_reset() {
+  try {
+    return current_dataset_path();
+  } catch (...) {
+    warn("Invalid current symlinks; resetting to system partition");
+    reset_to_system();
+    return std::string();
+  }
+}
+
+// Steps 5 to 9 under fallback A: any failure, of any type, abandons the
+// dataset work and resets the links to the system partition.
+void select_datasets() {
+  try {
+    const vell_dataset system;
+    const std::string latest_path = read_latest_link();
+    const vell_dataset current(current_path_or_reset());
+    // Selection and promotion (step 9) are not built yet.
+    static_cast<void>(system);
+    static_cast<void>(latest_path);
+    static_cast<void>(current);
+  } catch (...) {
+    warn("Unable to locate data; resetting to system partition");
+    reset_to_system();
+  }
+}
+
+}  // namespace
 
 int run_startup() {
   // Steps 1 and 2 (directory protection, legacy ICU link) are not built yet.
   std::remove("/var/db/timezone/needs_cleanup");
   std::remove("/var/db/icu");
-  // Steps 5 to 9 (datasets, selection, promotion) are not built yet.
+  select_datasets();
   check_localtime_link();
   return 0;
 }

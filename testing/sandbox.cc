@@ -29,6 +29,16 @@ const char* const covered[] = {"/var", "/usr/share"};
                            " (tests need a private mount namespace; refusing to run on the host)");
 }
 
+[[noreturn]] void fail_layout(const std::string& what) {
+  throw std::runtime_error("lay_out: " + what + ": " + std::strerror(errno));
+}
+
+// A later entry replaces a file or link that an earlier one put at the same path.
+void make_room(const std::string& path) {
+  struct stat st;
+  if (lstat(path.c_str(), &st) == 0 && !S_ISDIR(st.st_mode)) unlink(path.c_str());
+}
+
 void write_proc(const char* path, const std::string& text) {
   const int fd = open(path, O_WRONLY | O_CLOEXEC);
   if (fd < 0 || write(fd, text.data(), text.size()) != static_cast<ssize_t>(text.size())) fail(path);
@@ -55,12 +65,16 @@ void enter_private_namespace() {
   entered = true;
 }
 
-void make_parents(const std::string& path) {
-  for (size_t slash = path.find('/', 1); slash != std::string::npos; slash = path.find('/', slash + 1))
-    mkdir(path.substr(0, slash).c_str(), 0755);
-}
 
 // Splits "path [0640]" into the path and its mode.
+void make_parents(const std::string& path) {
+  for (size_t slash = path.find('/', 1); slash != std::string::npos; slash = path.find('/', slash + 1)) {
+    const std::string parent = path.substr(0, slash);
+    make_room(parent);
+    mkdir(parent.c_str(), 0755);
+  }
+}
+
 std::string take_mode(std::string left, mode_t* mode) {
   const size_t open_bracket = left.rfind(" [");
   if (open_bracket != std::string::npos && left.back() == ']') {
@@ -76,15 +90,17 @@ void lay_out_one(const std::string& entry) {
   if (arrow != std::string::npos && (equals == std::string::npos || arrow < equals)) {
     const std::string path = entry.substr(0, arrow);
     make_parents(path);
-    if (symlink(entry.substr(arrow + 4).c_str(), path.c_str()) != 0) fail("symlink " + path);
+    make_room(path);
+    if (symlink(entry.substr(arrow + 4).c_str(), path.c_str()) != 0) fail_layout("symlink " + path);
     return;
   }
   if (equals != std::string::npos) {
     mode_t mode = 0644;
     const std::string path = take_mode(entry.substr(0, equals), &mode);
     make_parents(path);
+    make_room(path);
     std::ofstream(path, std::ios::binary) << entry.substr(equals + 3);
-    if (chmod(path.c_str(), mode) != 0) fail("chmod " + path);
+    if (chmod(path.c_str(), mode) != 0) fail_layout("chmod " + path);
     return;
   }
   mode_t mode = 0755;
@@ -92,7 +108,8 @@ void lay_out_one(const std::string& entry) {
   if (path.empty() || path.back() != '/') throw std::invalid_argument("lay_out: cannot read " + entry);
   path.pop_back();
   make_parents(path);
-  if (mkdir(path.c_str(), mode) != 0 && errno != EEXIST) fail("mkdir " + path);
+  make_room(path);
+  if (mkdir(path.c_str(), mode) != 0 && errno != EEXIST) fail_layout("mkdir " + path);
   chmod(path.c_str(), mode);
 }
 

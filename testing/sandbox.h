@@ -28,6 +28,7 @@ class sandbox {
   ///   "/a/link -> target"  a symbolic link
   ///   "/a/file = text"     a file holding the rest verbatim (mode 0644)
   ///   "/a/file [0640] = text", "/a/dir/ [0700]"  the same with a mode
+  /// A later entry replaces a file or link at the same path.
   static void lay_out(std::initializer_list<std::string> entries);
 };
 

@@ -1,0 +1,52 @@
+#include "dataset/dataset.h"
+
+#include <err.h>
+
+#include <algorithm>
+#include <stdexcept>
+
+#include "dataset/icu.h"
+#include "dataset/zoneinfo.h"
+
+namespace vell {
+namespace {
+const std::string tz_prefix = "/var/db/timezone/tz/";
+}  // namespace
+
+vell_dataset::vell_dataset() { create_components(); }
+
+vell_dataset::vell_dataset(const std::string& path) : path_(path) { create_components(); }
+
+void vell_dataset::create_components() {
+  // Made before the path is checked: even a rejected path has its version file read.
+  auto zoneinfo = std::make_shared<vell_zoneinfo>(path_);
+  if (path_.empty()) {
+    version_text_ = zoneinfo->version() + ".1.0";
+  } else if (path_.size() > tz_prefix.size() && path_.compare(0, tz_prefix.size(), tz_prefix) == 0) {
+    version_text_ = path_.substr(tz_prefix.size());
+  } else {
+    warn("vell_dataset::create_components: bad path %s", path_.c_str());
+    throw std::invalid_argument("badpath");
+  }
+  parse_version(parsed_version_, version_text_);
+  components_.push_back(std::move(zoneinfo));
+  components_.push_back(std::make_shared<vell_icu>(path_));
+}
+
+bool vell_dataset::same_path(const vell_dataset& other) const { return path_ == other.path_; }
+
+bool vell_dataset::compatible_with(const vell_dataset& other) const {
+  const size_t common = std::min(components_.size(), other.components_.size());
+  for (size_t i = 0; i < common; ++i) {
+    if (!components_[i]->compatible_schema(*other.components_[i])) return false;
+  }
+  return components_.size() == other.components_.size();
+}
+
+void vell_dataset::activate() const {
+  for (const auto& component : components_) component->activate();
+}
+
+bool operator>(const vell_dataset& a, const vell_dataset& b) { return a.version() > b.version(); }
+
+}  // namespace vell
