@@ -7,7 +7,10 @@
 
 #include "dataset/dataset.h"
 #include "dataset/links.h"
+#include "driver/selection.h"
+#include "housekeeping/legacy_icu.h"
 #include "housekeeping/localtime.h"
+#include "housekeeping/protection.h"
 
 namespace vell {
 namespace {
@@ -31,10 +34,8 @@ void select_datasets() {
     const vell_dataset system;
     const std::string latest_path = read_latest_link();
     const vell_dataset current(current_path_or_reset());
-    // Selection and promotion (step 9) are not built yet.
-    static_cast<void>(system);
-    static_cast<void>(latest_path);
-    static_cast<void>(current);
+    const vell_dataset& active = select_active_dataset(system, current);
+    promote_latest_update(latest_path, system, current, active);
   } catch (...) {
     warn("Unable to locate data; resetting to system partition");
     reset_to_system();
@@ -44,7 +45,8 @@ void select_datasets() {
 }  // namespace
 
 int run_startup() {
-  // Steps 1 and 2 (directory protection, legacy ICU link) are not built yet.
+  protect_data_directories();
+  migrate_legacy_icu_link();
   std::remove("/var/db/timezone/needs_cleanup");
   std::remove("/var/db/icu");
   select_datasets();

@@ -178,7 +178,11 @@ std::string snapshot() {
   return all;
 }
 
-run_result run_vell() {
+run_result run_vell(const std::vector<std::string>& wrapper) {
+  std::vector<char*> argv;
+  for (const std::string& word : wrapper) argv.push_back(const_cast<char*>(word.c_str()));
+  argv.push_back(const_cast<char*>(wrapper.empty() ? "vell" : VELL_BINARY));
+  argv.push_back(nullptr);
   int pipe_fds[2];
   if (pipe2(pipe_fds, O_CLOEXEC) != 0) fail("pipe");
   const pid_t child = fork();
@@ -188,9 +192,8 @@ run_result run_vell() {
     const int null_fd = open("/dev/null", O_RDONLY);
     dup2(null_fd, 0);
     alarm(20);
-    char* const argv[] = {const_cast<char*>("vell"), nullptr};
     char* const envp[] = {nullptr};
-    execve(VELL_BINARY, argv, envp);
+    execve(wrapper.empty() ? VELL_BINARY : argv[0], argv.data(), envp);
     _exit(127);
   }
   close(pipe_fds[1]);

@@ -45,9 +45,11 @@ struct run_result {
   std::vector<std::string> messages;  // stderr lines without "vell: "
 };
 
-/// Runs the real vell binary with no arguments and an empty environment.
-/// A run that takes over 20 seconds is killed by SIGALRM.
-run_result run_vell();
+/// Runs the real vell binary with no arguments and an empty environment,
+/// under `wrapper` (a command and its arguments, such as strace) when given;
+/// the wrapper's own stderr lines come back among the messages. A run that
+/// takes over 20 seconds is killed by SIGALRM.
+run_result run_vell(const std::vector<std::string>& wrapper = {});
 
 /// Runs `fn` in this process and returns what it printed on stderr, line by
 /// line without the "vell: " prefix. Exceptions from `fn` are passed on
