@@ -12,6 +12,7 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <sstream>
@@ -178,10 +179,16 @@ std::string snapshot() {
   return all;
 }
 
+// The binary under test; testing/run-unprivileged moves it where nobody can reach it.
+const char* vell_binary() {
+  const char* moved = std::getenv("VELL_TEST_BINARY");
+  return moved != nullptr ? moved : VELL_BINARY;
+}
+
 run_result run_vell(const std::vector<std::string>& wrapper) {
   std::vector<char*> argv;
   for (const std::string& word : wrapper) argv.push_back(const_cast<char*>(word.c_str()));
-  argv.push_back(const_cast<char*>(wrapper.empty() ? "vell" : VELL_BINARY));
+  argv.push_back(const_cast<char*>(wrapper.empty() ? "vell" : vell_binary()));
   argv.push_back(nullptr);
   int pipe_fds[2];
   if (pipe2(pipe_fds, O_CLOEXEC) != 0) fail("pipe");
@@ -193,7 +200,7 @@ run_result run_vell(const std::vector<std::string>& wrapper) {
     dup2(null_fd, 0);
     alarm(20);
     char* const envp[] = {nullptr};
-    execve(wrapper.empty() ? VELL_BINARY : argv[0], argv.data(), envp);
+    execve(wrapper.empty() ? vell_binary() : argv[0], argv.data(), envp);
     _exit(127);
   }
   close(pipe_fds[1]);
