@@ -245,6 +245,36 @@ std::vector<std::string> messages_of(const std::function<void()>& fn) {
   return split_lines(text);
 }
 
+call_result call(const std::function<void()>& fn) {
+  call_result result;
+  result.messages = messages_of([&] {
+    try {
+      fn();
+    } catch (int value) {
+      result.thrown = value;
+    }
+  });
+  return result;
+}
+
+void lay_out_device() {
+  sandbox::lay_out({
+      "/usr/share/zoneinfo.default/+VERSION =  2016c\n2017a",
+      "/usr/share/zoneinfo.default/America/Los_Angeles = TZif",
+      "/usr/share/icu/icutzformat.txt = 44l\n",
+      "/var/db/timezone/localtime -> /var/db/timezone/zoneinfo/America/Los_Angeles",
+      "/var/db/timezone/TZVersionDiffRecord = 2015z.1.0_2016a.1.0",
+      "/var/db/timezone/needs_cleanup = stale",
+      "/var/db/icu/",
+  });
+  for (const char* version : {"2016a.1.0", "2016b.1.0", "2016d.1.0", "2016e.1.0", "2017a.1.0"}) {
+    const std::string dataset = std::string("/var/db/timezone/tz/") + version;
+    const char* schema = version[3] == '7' ? "44b" : "44l";
+    sandbox::lay_out({dataset + "/zoneinfo/America/Los_Angeles = TZif",
+                      dataset + "/icutz/icutz" + schema + ".dat = ICU"});
+  }
+}
+
 void expect_messages(const std::vector<std::string>& got, const std::vector<std::string>& want) {
   std::string got_text, want_text;
   for (size_t i = 0; i < got.size(); ++i) {

@@ -56,6 +56,20 @@ run_result run_vell(const std::vector<std::string>& wrapper = {});
 /// after stderr is restored.
 std::vector<std::string> messages_of(const std::function<void()>& fn);
 
+/// What an in-process call printed, and the int it threw (0 when none).
+struct call_result {
+  std::vector<std::string> messages;
+  int thrown = 0;
+};
+call_result call(const std::function<void()>& fn);
+
+/// A device for end-to-end starts: system data 2016c (its "+VERSION" holds
+/// more than one word) with ICU schema 44l; downloads 2016a.1.0, 2016b.1.0,
+/// 2016d.1.0 and 2016e.1.0 built for 44l and 2017a.1.0 built for 44b; a
+/// local-time link of the present form; a stale marker and /var/db/icu; the
+/// record "2015z.1.0_2016a.1.0". No zoneinfo, icutz or tz_latest link.
+void lay_out_device();
+
 /// Compares printed lines with expected ones. An expected line ending in
 /// ": *" accepts any error text after that point; the others must be exact.
 void expect_messages(const std::vector<std::string>& got,
