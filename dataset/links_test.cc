@@ -24,7 +24,8 @@ TEST(DatasetPathOfLink, DerivesTheDatasetDirectory) {
       {"/usr/share/zoneinfo", nullptr},
       {"", nullptr},
   };
-  for (const auto& [target, want] : target_path) {
+  for (const auto& [target_text, want] : target_path) {
+    const std::string& target = target_text;  // a binding cannot be captured before C++20 in clang 14
     SCOPED_TRACE(target);
     std::string path = "unset";
     const call_result result = call([&] { path = dataset_path_of_link(target); });

@@ -52,10 +52,10 @@ TEST(Version, StrictOrder) {
       {"2016b", "2016a.9.9"}, {"2017a", "2016z.9.9"}, {"2016za.1.0", "2016z.1.0"}, {"2016a.1.0", "2016a"},
       {"2016a.1.1", "2016a.1.0"}, {"2016a.0", "2016a"}, {"0a", "unknown"}, {"2016b.0.0", "2016ab.9.9"},
   };
-  for (const auto& [newer_text, older_text] : newer_older) {
-    SCOPED_TRACE(std::string(newer_text) + " > " + older_text);
-    vell_version newer(newer_text), older;
-    messages_of([&] { older = vell_version(older_text); });
+  for (const auto& pair : newer_older) {
+    SCOPED_TRACE(std::string(pair.first) + " > " + pair.second);
+    vell_version newer(pair.first), older;
+    messages_of([&] { older = vell_version(pair.second); });
     EXPECT_TRUE(newer > older);
     EXPECT_FALSE(older > newer);
     EXPECT_FALSE(newer == older);

@@ -1,0 +1,223 @@
+// Prints what one start of vell costs, beside what the same start must cost
+// at least: the C floor (its file-system calls, nothing else) and the library
+// floor (its standard-library work, with each library). Runs in a private
+// mount namespace over the tests' sample device.
+//   vell_bench [RUNS] [--vell PATH] [--profile DIR]
+// RUNS interleaved timed runs (default 200); --vell measures another build of
+// vell; --profile keeps each program's callgrind file in DIR.
+#include <fcntl.h>
+#include <signal.h>
+#include <spawn.h>
+#include <sys/ptrace.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <time.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "testing/sandbox.h"
+
+extern char** environ;
+
+namespace {
+
+using vell::testing::sandbox;
+
+struct program {
+  const char* name;
+  std::string path;
+};
+
+struct start {
+  const char* name;
+  std::vector<std::string> links;
+};
+
+const char* const changed_by_a_start[] = {
+    "/var/db/timezone/zoneinfo", "/var/db/timezone/icutz",          "/var/db/timezone/tz_latest",
+    "/var/db/timezone/needs_cleanup", "/var/db/timezone/TZVersionDiffRecord", "/var/db/timezone/localtime"};
+
+void prepare(const start& s) {
+  for (const char* path : changed_by_a_start) unlink(path);
+  for (const std::string& entry : s.links) sandbox::lay_out({entry});
+}
+
+// Runs `argv` with its output discarded; returns wall nanoseconds.
+long run(const std::vector<std::string>& argv, const char* stderr_to = "/dev/null") {
+  std::vector<char*> args;
+  for (const std::string& word : argv) args.push_back(const_cast<char*>(word.c_str()));
+  args.push_back(nullptr);
+  posix_spawn_file_actions_t actions;
+  posix_spawn_file_actions_init(&actions);
+  posix_spawn_file_actions_addopen(&actions, 1, "/dev/null", O_WRONLY, 0);
+  posix_spawn_file_actions_addopen(&actions, 2, stderr_to, O_WRONLY | O_CREAT | O_TRUNC, 0600);
+  char* empty_env[] = {nullptr};
+  timespec t0, t1;
+  clock_gettime(CLOCK_MONOTONIC, &t0);
+  pid_t pid;
+  if (posix_spawn(&pid, args[0], &actions, nullptr, args.data(), empty_env) != 0) {
+    std::perror(args[0]);
+    std::exit(1);
+  }
+  int status;
+  waitpid(pid, &status, 0);
+  clock_gettime(CLOCK_MONOTONIC, &t1);
+  posix_spawn_file_actions_destroy(&actions);
+  return (t1.tv_sec - t0.tv_sec) * 1000000000L + (t1.tv_nsec - t0.tv_nsec);
+}
+
+std::string read_file(const std::string& path) {
+  std::ifstream in(path);
+  std::stringstream text;
+  text << in.rdbuf();
+  return text.str();
+}
+
+// Peak resident memory of the program's own image, read at its exit: the
+// rusage of a child would also count the memory it had before exec.
+long peak_rss_kib(const program& p, const start& s) {
+  prepare(s);
+  const pid_t pid = fork();
+  if (pid == 0) {
+    ptrace(PTRACE_TRACEME, 0, nullptr, nullptr);
+    const int null_fd = open("/dev/null", O_WRONLY);
+    dup2(null_fd, 1);
+    dup2(null_fd, 2);
+    char* argv[] = {const_cast<char*>(p.path.c_str()), nullptr};
+    char* envp[] = {nullptr};
+    execve(argv[0], argv, envp);
+    _exit(127);
+  }
+  long peak = -1;
+  int status;
+  waitpid(pid, &status, 0);  // stopped at its exec
+  ptrace(PTRACE_SETOPTIONS, pid, nullptr, PTRACE_O_TRACEEXIT);
+  ptrace(PTRACE_CONT, pid, nullptr, nullptr);
+  while (waitpid(pid, &status, 0) == pid && WIFSTOPPED(status)) {
+    int pass = WSTOPSIG(status);
+    if (status >> 8 == (SIGTRAP | (PTRACE_EVENT_EXIT << 8))) {
+      std::istringstream lines(read_file("/proc/" + std::to_string(pid) + "/status"));
+      for (std::string line; std::getline(lines, line);)
+        if (line.rfind("VmHWM:", 0) == 0) peak = std::atol(line.c_str() + 6);
+      pass = 0;
+    }
+    ptrace(PTRACE_CONT, pid, nullptr, pass);
+  }
+  return peak;
+}
+
+// With --profile DIR, each program's callgrind file is kept there for callgrind_annotate.
+std::string profile_dir;
+
+long instructions(const program& p, const start& s, const std::string& scratch) {
+  prepare(s);
+  std::string out = "/dev/null";
+  if (!profile_dir.empty()) out = profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." + std::to_string(s.links.size()) + ".callgrind";
+  run({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out, p.path}, scratch.c_str());
+  const std::string log = read_file(scratch);
+  const size_t at = log.find("Collected : ");
+  return at == std::string::npos ? -1 : std::atol(log.c_str() + at + 12);
+}
+
+// System calls before the program first touches the device's paths, and after.
+std::pair<int, int> system_calls(const program& p, const start& s, const std::string& scratch) {
+  prepare(s);
+  run({"/usr/bin/strace", "-f", "-o", scratch, p.path});
+  std::istringstream trace(read_file(scratch));
+  int before = 0, after = 0;
+  bool started = false;
+  for (std::string line; std::getline(trace, line);) {
+    if (line.find("+++") != std::string::npos || line.find("resumed>") != std::string::npos) continue;
+    started = started || line.find("\"/var/db") != std::string::npos || line.find("\"/usr/share") != std::string::npos;
+    ++(started ? after : before);
+  }
+  return {before, after};
+}
+
+struct figures {
+  long instructions = 0;
+  std::pair<int, int> calls;
+  std::vector<long> wall;
+  long rss_kib = 0;
+  double median_us() const {
+    std::vector<long> sorted = wall;
+    std::sort(sorted.begin(), sorted.end());
+    return sorted.empty() ? 0 : sorted[sorted.size() / 2] / 1000.0;
+  }
+};
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  int runs = 200;
+  std::string vell_path = VELL_BINARY;
+  for (int i = 1; i < argc; ++i) {
+    if (std::string(argv[i]) == "--profile" && i + 1 < argc) {
+      profile_dir = argv[++i];
+    } else if (std::string(argv[i]) == "--vell" && i + 1 < argc) {
+      vell_path = argv[++i];
+    } else {
+      runs = std::atoi(argv[i]);
+    }
+  }
+  const std::string dir = BENCH_DIR;
+  const std::vector<program> programs = {{"vell", vell_path},
+                                         {"C floor", dir + "/c_floor"},
+                                         {"library floor, libstdc++", dir + "/library_floor_libstdcxx"},
+                                         {"library floor, libc++", dir + "/library_floor_libcxx"}};
+  const std::string d = "/var/db/timezone/tz/2016d.1.0";
+  const std::string localtime = "/var/db/timezone/localtime -> /var/db/timezone/zoneinfo/America/Los_Angeles";
+  const std::vector<start> starts = {
+      {"steady start (links and tz_latest name 2016d.1.0)",
+       {"/var/db/timezone/zoneinfo -> " + d + "/zoneinfo", "/var/db/timezone/icutz -> " + d + "/icutz",
+        "/var/db/timezone/tz_latest -> " + d, localtime}},
+      {"promotion (links name the system data, tz_latest 2016d.1.0)",
+       {"/var/db/timezone/zoneinfo -> /usr/share/zoneinfo.default", "/var/db/timezone/tz_latest -> " + d, localtime}},
+      {"first start with reset (no links but tz_latest)", {"/var/db/timezone/tz_latest -> " + d}},
+  };
+  char scratch_name[] = "/tmp/vell-bench.XXXXXX";
+  close(mkstemp(scratch_name));
+  const std::string scratch = scratch_name;
+
+  sandbox box;
+  vell::testing::lay_out_device();
+  std::printf("%d interleaved runs per program and start; floors are those of the steady start.\n", runs);
+  for (const start& s : starts) {
+    std::map<std::string, figures> results;
+    for (const program& p : programs) {
+      results[p.name].instructions = instructions(p, s, scratch);
+      results[p.name].calls = system_calls(p, s, scratch);
+      results[p.name].rss_kib = peak_rss_kib(p, s);
+    }
+    for (int i = 0; i < runs; ++i) {
+      for (const program& p : programs) {
+        prepare(s);
+        figures& f = results[p.name];
+        f.wall.push_back(run({p.path}));
+      }
+    }
+    std::printf("\n%s\n  %-26s %14s %12s %22s %10s\n", s.name, "program", "instructions", "wall (us)",
+                "syscalls start+own", "peak KiB");
+    for (const program& p : programs) {
+      const figures& f = results[p.name];
+      std::printf("  %-26s %14ld %12.1f %14d + %-6d %10ld\n", p.name, f.instructions, f.median_us(), f.calls.first,
+                  f.calls.second, f.rss_kib);
+    }
+    const figures& vell = results["vell"];
+    const figures& c_floor = results["C floor"];
+    const figures& library = std::min(results["library floor, libstdc++"], results["library floor, libc++"],
+                                      [](const figures& a, const figures& b) { return a.instructions < b.instructions; });
+    std::printf("  vell / C floor: wall %.2fx    vell / cheaper library floor: instructions %.2fx\n",
+                vell.median_us() / c_floor.median_us(), double(vell.instructions) / library.instructions);
+  }
+  unlink(scratch_name);
+  return 0;
+}
