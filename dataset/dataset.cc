@@ -13,6 +13,10 @@ namespace {
 const std::string tz_prefix = "/var/db/timezone/tz/";
 }  // namespace
 
+bool is_dataset_path(const std::string& path) {
+  return path.size() > tz_prefix.size() && path.compare(0, tz_prefix.size(), tz_prefix) == 0;
+}
+
 vell_dataset::vell_dataset() { create_components(); }
 
 vell_dataset::vell_dataset(const std::string& path) : path_(path) { create_components(); }
@@ -22,7 +26,7 @@ void vell_dataset::create_components() {
   auto zoneinfo = std::make_shared<vell_zoneinfo>(path_);
   if (path_.empty()) {
     version_text_ = zoneinfo->version() + ".1.0";
-  } else if (path_.size() > tz_prefix.size() && path_.compare(0, tz_prefix.size(), tz_prefix) == 0) {
+  } else if (is_dataset_path(path_)) {
     version_text_ = path_.substr(tz_prefix.size());
   } else {
     warn("vell_dataset::create_components: bad path %s", path_.c_str());

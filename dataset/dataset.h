@@ -46,6 +46,10 @@ class vell_dataset {
   std::vector<std::shared_ptr<vell_dataset_component>> components_;
 };
 
+/// The rule for a downloaded dataset's path: longer than
+/// "/var/db/timezone/tz/" and starting with it.
+bool is_dataset_path(const std::string& path);
+
 /// Compares the parsed versions only.
 bool operator>(const vell_dataset& a, const vell_dataset& b);
 

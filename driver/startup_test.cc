@@ -1,4 +1,7 @@
 // Whole starts of the real binary: the fallbacks and the exit status.
+#include <algorithm>
+#include <iterator>
+
 #include <gtest/gtest.h>
 
 #include "testing/sandbox.h"
@@ -7,6 +10,8 @@ namespace vell {
 namespace {
 
 using namespace vell::testing;
+
+const std::string tz = "/var/db/timezone/tz/";
 
 TEST(Startup, FallsBackToTheSystemPartition) {
   const std::string invalid = "Invalid current symlinks; resetting to system partition: *";
@@ -59,6 +64,48 @@ TEST(Startup, FallsBackToTheSystemPartition) {
     EXPECT_EQ(show("/var/db/timezone/zoneinfo"), c.zoneinfo_after);
     EXPECT_EQ(show("/var/db/timezone/needs_cleanup"), "absent");  // cleared first, and no fallback sets it
     EXPECT_EQ(show("/var/db/icu"), "absent");
+  }
+}
+
+// Hostile bytes in every file and link a start reads: each start ends
+// normally, prints only vell's own messages and leaves usable links.
+TEST(Startup, AnyBytesInFilesAndLinksEndNormally) {
+  const std::string long_word = "2016c" + std::string(1019, 'x');  // 1024 bytes
+  const std::string values[] = {"", long_word, long_word + "x", "2016c\n2017a", "\n\n", "2016\xc3\xa9",
+                                std::string("20\0" "16c", 5), "\xff\xfe/..//"};
+  const std::string places[] = {
+      "/usr/share/zoneinfo.default/+VERSION = ", "/usr/share/icu/icutzformat.txt = ",
+      "/var/db/timezone/tz/2016d.1.0/zoneinfo/+VERSION = ", "/var/db/timezone/zoneinfo -> ",
+      "/var/db/timezone/zoneinfo -> " + tz + "2016d.1.0/", "/var/db/timezone/tz_latest -> " + tz,
+      "/var/db/timezone/localtime -> ", "/var/db/timezone/localtime -> /usr/share/zoneinfo/"};
+  const char* const own_messages[] = {
+      "Cannot parse version string ", "Bad zoneinfo link ", "Invalid current symlinks; resetting to system partition",
+      "Unable to locate data; resetting to system partition", "Symlink points at data incompatible",
+      "New update not compatible or older version: ", "No ICU schema found for ", "localtime link invalid; resetting to ",
+      "Correcting localtime link to ", "read_symlink: ", "vell_dataset::create_components: bad path "};
+  for (const std::string& place : places) {
+    for (const std::string& value : values) {
+      const bool is_link = place.find(" -> ") != std::string::npos;
+      if (is_link && (value.find('\0') != std::string::npos || (value.empty() && place.ends_with("-> ")))) continue;
+      SCOPED_TRACE(place + value.substr(0, 40));
+      sandbox box;
+      lay_out_device();
+      sandbox::lay_out({"/var/db/timezone/zoneinfo -> " + tz + "2016d.1.0/zoneinfo",
+                        "/var/db/timezone/icutz -> " + tz + "2016d.1.0/icutz", "/var/db/timezone/tz_latest -> " + tz + "2016e.1.0"});
+      sandbox::lay_out({place + value});
+      const run_result run = run_vell();
+      EXPECT_EQ(run.status, 0);
+      // A message quoting a newline goes on in a line of its own.
+      for (const std::string& line : value.find('\n') == std::string::npos ? run.messages : std::vector<std::string>{}) {
+        EXPECT_TRUE(std::any_of(std::begin(own_messages), std::end(own_messages),
+                                [&](const char* own) { return line.starts_with(own); })) << line.substr(0, 200);
+      }
+      EXPECT_TRUE(show("/var/db/timezone/localtime").starts_with("-> /var/db/timezone/zoneinfo/"));
+      const std::string zoneinfo = show("/var/db/timezone/zoneinfo");
+      EXPECT_TRUE(zoneinfo == "-> /usr/share/zoneinfo.default" || zoneinfo == "-> " + tz + "2016d.1.0/zoneinfo" ||
+                  zoneinfo == "-> " + tz + "2016e.1.0/zoneinfo")
+          << zoneinfo;
+    }
   }
 }
 

@@ -23,10 +23,10 @@ bool starts_with(const std::string& text, const std::string& prefix) {
 }
 
 void rewrite_or_throw() {
-  const std::string target = read_symlink(localtime_link);
-  if (starts_with(target, zoneinfo_prefix)) return;
-  if (!starts_with(target, old_prefix)) throw -1;
-  const std::string corrected = zoneinfo_prefix + target.substr(sizeof old_prefix - 1);
+  std::string corrected;
+  const localtime_verdict verdict = localtime_rule(read_symlink(localtime_link), corrected);
+  if (verdict == localtime_verdict::keep) return;
+  if (verdict == localtime_verdict::reset) throw -1;
   warn("Correcting localtime link to %s", corrected.c_str());
   if (!exists(corrected)) throw -1;
   std::remove(localtime_link);
@@ -34,6 +34,13 @@ void rewrite_or_throw() {
 }
 
 }  // namespace
+
+localtime_verdict localtime_rule(const std::string& target, std::string& corrected) {
+  if (starts_with(target, zoneinfo_prefix)) return localtime_verdict::keep;
+  if (!starts_with(target, old_prefix)) return localtime_verdict::reset;
+  corrected = zoneinfo_prefix + target.substr(sizeof old_prefix - 1);
+  return localtime_verdict::rewrite;
+}
 
 void check_localtime_link() {
   try {
