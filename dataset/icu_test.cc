@@ -47,8 +47,7 @@ TEST(IcuSchema, CompatibleOnlyWithTheSameSchema) {
   const struct {
     const char *mine, *other;
     bool compatible;
-  } cases[] = {{"44l", "44l", true}, {"44l", "44b", false}, {"44l", "4l", false},
-               {"", "", true},       {"44l", "", false},    {"", "44l", false}};
+  } cases[] = {{"44l", "44l", true}, {"44l", "4l", false}, {"", "", true}, {"", "44l", false}};
   auto system_icu_with = [](const std::string& schema) {
     sandbox::lay_out({"/usr/share/icu/icutzformat.txt = \t" + schema + "\n"});
     return std::make_shared<vell_icu>("");

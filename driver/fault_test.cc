@@ -5,7 +5,6 @@
 // points where that cannot hold are listed, so that a new one fails.
 #include <signal.h>
 
-#include <cctype>
 #include <cstdio>
 #include <fstream>
 #include <map>
@@ -94,18 +93,13 @@ std::vector<fault_point> fault_points(const start_case& start) {
     const std::string name = line.substr(0, paren);
     const int occurrence = ++calls[name];
     const std::string first = line.substr(paren + 1, line.find_first_of(",)", paren) - paren - 1);
-    const std::string result = line.substr(line.rfind("= ") + 2);
     std::string label = name;
-    if (first.starts_with('"')) {
-      const std::string path = first.substr(1, first.find('"', 1) - 1);
-      if (path.starts_with('/') && !path.starts_with("/var/db") && !path.starts_with("/usr/share")) continue;
-      label += " " + path;
-    } else if (first == "AT_FDCWD") {
+    if (first.starts_with('"') || first == "AT_FDCWD") {
       const size_t quote = line.find('"', paren);
       const std::string path = line.substr(quote + 1, line.find('"', quote + 1) - quote - 1);
       if (path.starts_with('/') && !path.starts_with("/var/db") && !path.starts_with("/usr/share")) continue;
       label += " " + path;
-      if (name == "openat" && std::isdigit(static_cast<unsigned char>(result[0]))) own_descriptors.insert(result);
+      if (name == "openat") own_descriptors.insert(line.substr(line.rfind("= ") + 2));  // "-1 ..." matches none
     } else if (!own_descriptors.contains(first)) {
       continue;
     } else if (name == "close") {
@@ -118,15 +112,12 @@ std::vector<fault_point> fault_points(const start_case& start) {
   return points;
 }
 
-bool is_data(const std::string& snapshot_line) {
-  return snapshot_line.starts_with(tz) || snapshot_line.starts_with("/usr/share/");
-}
-
+// What a start must never change: downloaded and system data.
 std::string data_lines() {
   std::istringstream all(snapshot());
   std::string kept;
   for (std::string line; std::getline(all, line);) {
-    if (is_data(line)) kept += line + "\n";
+    if (line.starts_with(tz) || line.starts_with("/usr/share/")) kept += line + "\n";
   }
   return kept;
 }

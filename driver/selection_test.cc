@@ -55,18 +55,6 @@ TEST(Selection, OutcomeTable) {
   }
 }
 
-TEST(Selection, PromotionThenSteadyState) {
-  sandbox box;
-  lay_out_device();
-  sandbox::lay_out({"/var/db/timezone/zoneinfo " + zoneinfo_of(""), "/var/db/timezone/tz_latest -> " + tz + "2016d.1.0"});
-  expect_messages(run_vell().messages, {});
-  const std::string promoted = snapshot();
-  const run_result run = run_vell();
-  EXPECT_EQ(run.status, 0);
-  expect_messages(run.messages, {"New update not compatible or older version: 2016d.1.0 vs. 2016d.1.0: *"});
-  EXPECT_EQ(snapshot(), promoted);
-}
-
 TEST(Selection, MarkerBeforeRecordWhenADownloadIsDisplaced) {
   sandbox box;
   lay_out_device();
