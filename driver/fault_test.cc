@@ -20,11 +20,10 @@ namespace {
 
 using namespace vell::testing;
 
-const std::string tz = "/var/db/timezone/tz/";
-
 struct start_case {
   const char* name;
-  std::vector<std::string> links;
+  std::string current, latest;  // as lay_out_links takes them
+  std::vector<std::string> more;
   // "fault call first-path-argument": the points after which the starts
   // cannot repair the links, because a link is replaced in two steps and a
   // kept dataset is never activated again.
@@ -33,36 +32,25 @@ struct start_case {
 
 void PrintTo(const start_case& start, std::ostream* out) { *out << start.name; }
 
-std::vector<std::string> links_to(const std::string& dataset, const std::string& latest) {
-  return {"/var/db/timezone/zoneinfo -> " + tz + dataset + "/zoneinfo",
-          "/var/db/timezone/icutz -> " + tz + dataset + "/icutz",
-          "/var/db/timezone/tz_latest -> " + tz + latest};
-}
-
-std::vector<std::string> with(std::vector<std::string> links, const std::string& more) {
-  links.push_back(more);
-  return links;
-}
-
 const start_case starts[] = {
-    {"first_start", {"/var/db/timezone/tz_latest -> " + tz + "2016d.1.0"},
+    {"first_start", "", "2016d.1.0", {},
      {"kill unlink /var/db/timezone/icutz #2", "kill unlink /var/db/icutz #2",
       "kill symlink /var/db/timezone/tz/2016d.1.0/icutz"}},
-    {"promotion", links_to("2016d.1.0", "2016e.1.0"),
+    {"promotion", "2016d.1.0", "2016e.1.0", {},
      {"kill unlink /var/db/timezone/icutz", "kill unlink /var/db/icutz",
       "kill symlink /var/db/timezone/tz/2016e.1.0/icutz"}},
-    {"steady", links_to("2016e.1.0", "2016e.1.0"), {}},
+    {"steady", "2016e.1.0", "2016e.1.0", {}, {}},
     // The reset swallows a failed removal of the ICU link, so an EIO leaves it too.
-    {"incompatible_reset", links_to("2017a.1.0", "2017a.1.0"),
+    {"incompatible_reset", "2017a.1.0", "2017a.1.0", {},
      {"kill unlink /var/db/timezone/icutz", "eio unlink /var/db/timezone/icutz"}},
-    {"old_localtime_form",
-     with(links_to("2016e.1.0", "2016e.1.0"), "/var/db/timezone/localtime -> /usr/share/zoneinfo/America/Los_Angeles"),
-     {}},
+    {"old_localtime_form", "2016e.1.0", "2016e.1.0",
+     {"/var/db/timezone/localtime -> /usr/share/zoneinfo/America/Los_Angeles"}, {}},
 };
 
 void lay_out(const start_case& start) {
   lay_out_device();
-  for (const std::string& entry : start.links) sandbox::lay_out({entry});
+  lay_out_links(start.current, start.latest);
+  for (const std::string& entry : start.more) sandbox::lay_out({entry});
 }
 
 // A place to inject: the n-th call of `name` since the process began.
@@ -166,12 +154,12 @@ TEST_P(Faults, EveryFileSystemCallOfAStart) {
   ASSERT_GT(points.size(), 10u) << "the trace of an unfaulted start is missing";
   std::set<std::string> failing;
   for (const fault_point& point : points) {
-    for (const char* fault : {"error=EIO", "signal=KILL"}) {
+    for (const auto& [fault_name, fault] : {std::pair{"eio ", "error=EIO"}, std::pair{"kill ", "signal=KILL"}}) {
       sandbox box;
       lay_out(start);
       const std::string problem = check_fault(point, fault, data_lines());
       if (problem.empty()) continue;
-      const std::string key = std::string(fault == std::string("error=EIO") ? "eio " : "kill ") + point.label;
+      const std::string key = fault_name + point.label;
       failing.insert(key);
       if (!start.known.contains(key)) ADD_FAILURE() << key << ": " << problem;
     }

@@ -8,8 +8,6 @@ namespace {
 
 using namespace vell::testing;
 
-const std::string tz = "/var/db/timezone/tz/";
-
 std::string zoneinfo_of(const std::string& dataset) {
   return "-> " + (dataset.empty() ? "/usr/share/zoneinfo.default" : tz + dataset + "/zoneinfo");
 }
@@ -42,9 +40,7 @@ TEST(Selection, OutcomeTable) {
     SCOPED_TRACE(c.name);
     sandbox box;
     lay_out_device();
-    sandbox::lay_out({"/var/db/timezone/zoneinfo " + zoneinfo_of(c.current)});
-    if (!c.current.empty()) sandbox::lay_out({"/var/db/timezone/icutz -> " + tz + c.current + "/icutz"});
-    if (!c.latest.empty()) sandbox::lay_out({"/var/db/timezone/tz_latest -> " + tz + c.latest});
+    lay_out_links(c.current.empty() ? "system" : c.current, c.latest);
     const run_result run = run_vell();
     EXPECT_EQ(run.status, 0);
     expect_messages(run.messages, c.messages);
@@ -58,7 +54,7 @@ TEST(Selection, OutcomeTable) {
 TEST(Selection, MarkerBeforeRecordWhenADownloadIsDisplaced) {
   sandbox box;
   lay_out_device();
-  sandbox::lay_out({"/var/db/timezone/zoneinfo " + zoneinfo_of("2016d.1.0"), "/var/db/timezone/tz_latest -> " + tz + "2016e.1.0"});
+  lay_out_links("2016d.1.0", "2016e.1.0");
   std::vector<std::string> opened;
   for (const std::string& line : run_vell({"/usr/bin/strace", "-qq", "-e", "trace=openat"}).messages) {
     if (line.find("needs_cleanup") != std::string::npos) opened.push_back("marker");

@@ -275,6 +275,16 @@ void lay_out_device() {
   }
 }
 
+void lay_out_links(const std::string& current, const std::string& latest) {
+  if (current == "system") {
+    sandbox::lay_out({"/var/db/timezone/zoneinfo -> /usr/share/zoneinfo.default"});
+  } else if (!current.empty()) {
+    sandbox::lay_out({"/var/db/timezone/zoneinfo -> " + tz + current + "/zoneinfo",
+                      "/var/db/timezone/icutz -> " + tz + current + "/icutz"});
+  }
+  if (!latest.empty()) sandbox::lay_out({"/var/db/timezone/tz_latest -> " + tz + latest});
+}
+
 void expect_messages(const std::vector<std::string>& got, const std::vector<std::string>& want) {
   std::string got_text, want_text;
   for (size_t i = 0; i < got.size(); ++i) {

@@ -63,6 +63,14 @@ struct call_result {
 };
 call_result call(const std::function<void()>& fn);
 
+/// The folder of downloaded datasets.
+inline const std::string tz = "/var/db/timezone/tz/";
+
+/// Links zoneinfo and icutz to the download `current` (zoneinfo alone to the
+/// system partition for "system", no link for ""), and tz_latest to the
+/// download `latest` (no link for "").
+void lay_out_links(const std::string& current, const std::string& latest);
+
 /// A device for end-to-end starts: system data 2016c (its "+VERSION" holds
 /// more than one word) with ICU schema 44l; downloads 2016a.1.0, 2016b.1.0,
 /// 2016d.1.0 and 2016e.1.0 built for 44l and 2017a.1.0 built for 44b; a
