@@ -7,14 +7,13 @@
 
 #include "dataset/icu.h"
 #include "dataset/zoneinfo.h"
+#include "fs/paths.h"
 
 namespace vell {
-namespace {
-const std::string tz_prefix = "/var/db/timezone/tz/";
-}  // namespace
 
 bool is_dataset_path(const std::string& path) {
-  return path.size() > tz_prefix.size() && path.compare(0, tz_prefix.size(), tz_prefix) == 0;
+  const std::string prefix = paths::downloads;
+  return path.size() > prefix.size() && path.compare(0, prefix.size(), prefix) == 0;
 }
 
 vell_dataset::vell_dataset() { create_components(); }
@@ -27,7 +26,7 @@ void vell_dataset::create_components() {
   if (path_.empty()) {
     version_text_ = zoneinfo->version() + ".1.0";
   } else if (is_dataset_path(path_)) {
-    version_text_ = path_.substr(tz_prefix.size());
+    version_text_ = path_.substr(sizeof paths::downloads - 1);
   } else {
     warn("vell_dataset::create_components: bad path %s", path_.c_str());
     throw std::invalid_argument("badpath");

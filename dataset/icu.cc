@@ -6,47 +6,51 @@
 #include <sys/stat.h>
 
 #include <cstring>
-#include <fstream>
+#include <memory>
 #include <regex>
 
 #include "fs/path_ops.h"
+#include "fs/paths.h"
+#include "fs/small_files.h"
 
 namespace vell {
+namespace {
+
+// Closing the walk also returns to the directory it started in.
+struct fts_closer {
+  void operator()(FTS* walk) const { fts_close(walk); }
+};
+
+}  // namespace
 
 vell_icu::vell_icu(const std::string& dataset_path)
     : vell_dataset_component(dataset_path),
-      directory_(dataset_path.empty() ? "/usr/share/icu" : dataset_path + "/icutz") {
-  initialize();
-}
-
-void vell_icu::initialize() {
-  if (!dataset_path.empty()) {
+      directory_(dataset_path.empty() ? paths::system_icu : dataset_path + "/icutz") {
+  if (dataset_path.empty()) {
+    schema_ = read_first_word(directory_ + "/icutzformat.txt");
+  } else {
     find_schema_in_directory();
-    return;
   }
-  std::ifstream in(directory_ + "/icutzformat.txt");
-  in >> schema_;
 }
 
 void vell_icu::find_schema_in_directory() {
   const std::regex pattern("icutz([0-9]+[lbe])\\.dat");
-  char* const paths[] = {const_cast<char*>(directory_.c_str()), nullptr};
-  FTS* walk = fts_open(paths, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr);
-  if (walk == nullptr) {
+  char* const roots[] = {const_cast<char*>(directory_.c_str()), nullptr};
+  const std::unique_ptr<FTS, fts_closer> walk(
+      fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
+  if (!walk) {
     const int error = errno;
     warn("tz_icu::initialize: fts_open of %s failed, %s", directory_.c_str(), strerror(error));
     throw error;
   }
   // The walk's end and its failure are alike: whatever was found so far counts.
-  for (FTSENT* entry; (entry = fts_read(walk)) != nullptr;) {
-    if (!schema_.empty()) break;  // the first match wins
-    if (entry->fts_errno != 0 || entry->fts_level != 1 || entry->fts_namelen == 0 ||
-        entry->fts_info != FTS_F || (entry->fts_statp->st_mode & S_IROTH) == 0)
+  for (FTSENT* entry; schema_.empty() && (entry = fts_read(walk.get())) != nullptr;) {
+    if (entry->fts_errno != 0 || entry->fts_level != 1 || entry->fts_info != FTS_F ||
+        (entry->fts_statp->st_mode & S_IROTH) == 0)
       continue;
     std::cmatch match;
-    if (std::regex_match(entry->fts_name, match, pattern) && match.size() == 2) schema_ = match[1].str();
+    if (std::regex_match(entry->fts_name, match, pattern)) schema_ = match[1].str();
   }
-  fts_close(walk);
   if (schema_.empty()) warn("No ICU schema found for %s", dataset_path.c_str());
 }
 
@@ -60,15 +64,14 @@ bool vell_icu::compatible_schema(const vell_dataset_component& other) const {
 }
 
 void vell_icu::activate() const {
-  const std::string link = "/var/db/timezone/icutz";
   try {
-    remove(link);
-    remove("/var/db/icutz");
+    remove(paths::icutz_link);
+    remove(paths::legacy_icutz_link);
   } catch (...) {
     warn("unlink of ICU softlink failed");
   }
   if (dataset_path.empty()) return;  // the system's ICU data is used without a link
-  create_symlink(directory_, link);
+  create_symlink(directory_, paths::icutz_link);
 }
 
 }  // namespace vell

@@ -13,7 +13,8 @@ class vell_icu final : public vell_dataset_component {
  public:
   /// The directory is "/usr/share/icu" for the empty path, else
   /// dataset_path + "/icutz". The system dataset's schema is the first word
-  /// of "icutzformat.txt" (silently "" when missing); a downloaded one's comes
+  /// of "icutzformat.txt" (read_first_word: silently "" when missing or not
+  /// a regular file); a downloaded one's comes
   /// from the first file directly inside the directory named
   /// "icutz([0-9]+[lbe])\.dat", regular and readable by others, else
   /// "No ICU schema found for %s" and "". When the walk cannot start, prints
@@ -31,7 +32,6 @@ class vell_icu final : public vell_dataset_component {
   void activate() const override;
 
  private:
-  void initialize();
   void find_schema_in_directory();
 
   std::string schema_;

@@ -4,6 +4,7 @@
 
 #include "dataset/dataset.h"
 #include "fs/path_ops.h"
+#include "fs/paths.h"
 
 namespace vell {
 
@@ -12,19 +13,16 @@ void reset_to_system() {
   system.activate();
 }
 
-std::string read_latest_link() { return read_symlink("/var/db/timezone/tz_latest"); }
+std::string read_latest_link() { return read_symlink(paths::latest_link); }
 
-std::string current_dataset_path() { return dataset_path_of_link(read_symlink("/var/db/timezone/zoneinfo")); }
+std::string current_dataset_path() { return dataset_path_of_link(read_symlink(paths::zoneinfo_link)); }
 
 std::string dataset_path_of_link(const std::string& target) {
-  const std::string prefix = "/var/db/timezone/tz/";
-  if (target.size() > prefix.size() && target.compare(0, prefix.size(), prefix) == 0) {
-    // At least one byte must stand between the prefix and the last "/".
-    const size_t last_slash = target.rfind('/');
-    if (last_slash > prefix.size()) return target.substr(0, last_slash);
-  } else if (target == "/usr/share/zoneinfo.default") {
-    return std::string();
-  }
+  if (target == paths::system_zoneinfo) return std::string();
+  // The link names a folder inside the dataset: the dataset is what stands before the last "/".
+  const size_t last_slash = target.rfind('/');
+  if (last_slash != std::string::npos && is_dataset_path(target.substr(0, last_slash)))
+    return target.substr(0, last_slash);
   warn("Bad zoneinfo link %s", target.c_str());
   throw -1;
 }

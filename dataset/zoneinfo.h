@@ -11,8 +11,9 @@ namespace vell {
 class vell_zoneinfo final : public vell_dataset_component {
  public:
   /// The directory is "/usr/share/zoneinfo.default" for the empty path, else
-  /// dataset_path + "/zoneinfo". Reads the first word of its "+VERSION";
-  /// a missing or blank file silently gives "".
+  /// dataset_path + "/zoneinfo". Reads the first word of its "+VERSION"
+  /// (read_first_word: bounded, regular files only); a missing or blank file
+  /// silently gives "".
   explicit vell_zoneinfo(const std::string& dataset_path);
 
   /// The release name read from "+VERSION".
@@ -26,10 +27,8 @@ class vell_zoneinfo final : public vell_dataset_component {
   void activate() const override;
 
  private:
-  void read_version();
-
   const std::string directory_;
-  std::string version_;
+  const std::string version_;
 };
 
 }  // namespace vell

@@ -2,12 +2,13 @@
 
 #include <err.h>
 
-#include <cstdio>
 #include <string>
 
 #include "dataset/dataset.h"
 #include "dataset/links.h"
 #include "driver/selection.h"
+#include "fs/path_ops.h"
+#include "fs/paths.h"
 #include "housekeeping/legacy_icu.h"
 #include "housekeeping/localtime.h"
 #include "housekeeping/protection.h"
@@ -15,8 +16,8 @@
 namespace vell {
 namespace {
 
-// Fallback B: an unreadable zoneinfo link sends the links back to the system
-// partition, and the start goes on with the system data as current.
+// An unreadable zoneinfo link sends the links back to the system partition,
+// and the start goes on with the system data as current.
 std::string current_path_or_reset() {
   try {
     return current_dataset_path();
@@ -27,8 +28,9 @@ std::string current_path_or_reset() {
   }
 }
 
-// Steps 5 to 9 under fallback A: any failure, of any type, abandons the
-// dataset work and resets the links to the system partition.
+// The whole dataset work, from describing the system data to the promotion:
+// any failure, of any type, abandons it and resets the links to the system
+// partition.
 void select_datasets() {
   try {
     const vell_dataset system;
@@ -47,8 +49,9 @@ void select_datasets() {
 int run_startup() {
   protect_data_directories();
   migrate_legacy_icu_link();
-  std::remove("/var/db/timezone/needs_cleanup");
-  std::remove("/var/db/icu");
+  // The marker goes before anything can set it again.
+  remove_quietly(paths::cleanup_marker);
+  remove_quietly(paths::legacy_icu_dir);
   select_datasets();
   check_localtime_link();
   return 0;

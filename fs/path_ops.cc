@@ -4,6 +4,8 @@
 #include <errno.h>
 #include <unistd.h>
 
+#include <cstdio>
+
 namespace vell {
 
 void remove(const std::string& path) {
@@ -12,6 +14,8 @@ void remove(const std::string& path) {
   warn("remove: could not remove %s", path.c_str());
   throw error;
 }
+
+void remove_quietly(const std::string& path) { std::remove(path.c_str()); }
 
 bool exists(const std::string& path) { return access(path.c_str(), F_OK) == 0; }
 

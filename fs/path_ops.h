@@ -1,5 +1,5 @@
-// The four operations through which every link under /var/db/timezone is
-// read, removed and created. A failure prints one line through warn() and is
+// The operations through which every link under /var/db/timezone is read,
+// removed and created. A failure prints one line through warn() and is
 // thrown as the call's errno, a plain int; callers never look at the value.
 #ifndef VELL_FS_PATH_OPS_H_
 #define VELL_FS_PATH_OPS_H_
@@ -12,6 +12,10 @@ namespace vell {
 /// silent. Any other failure prints "remove: could not remove %s" and throws
 /// errno as int.
 void remove(const std::string& path);
+
+/// Deletes a file, a link or an empty directory and ignores every failure:
+/// for clean-up whose outcome nothing depends on. Never prints, never throws.
+void remove_quietly(const std::string& path);
 
 /// True when access(path, F_OK) succeeds; follows links, so a dangling link
 /// is false. Never prints, never throws.

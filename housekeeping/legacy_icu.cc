@@ -2,26 +2,23 @@
 
 #include <err.h>
 
-#include <string>
-
 #include "fs/path_ops.h"
+#include "fs/paths.h"
 
 namespace vell {
 
 void migrate_legacy_icu_link() {
-  const std::string legacy = "/var/db/icutz";
-  const std::string current = "/var/db/timezone/icutz";
-  if (exists(legacy) && !exists(current)) {
+  if (exists(paths::legacy_icutz_link) && !exists(paths::icutz_link)) {
     try {
-      create_symlink(read_symlink(legacy), current);
+      create_symlink(read_symlink(paths::legacy_icutz_link), paths::icutz_link);
     } catch (...) {
       warn("Could not migrate /var/db/icutz to /var/db/timezone/icutz");
     }
   }
   // Asked afresh: the legacy link goes whether or not the copy worked.
-  if (exists(legacy)) {
+  if (exists(paths::legacy_icutz_link)) {
     try {
-      remove(legacy);
+      remove(paths::legacy_icutz_link);
     } catch (...) {
       warn("Could not remove /var/db/icutz");
     }

@@ -2,20 +2,13 @@
 
 #include <err.h>
 
-#include <cstdio>
 #include <string>
 
 #include "fs/path_ops.h"
+#include "fs/paths.h"
 
 namespace vell {
 namespace {
-
-constexpr char localtime_link[] = "/var/db/timezone/localtime";
-constexpr char zoneinfo_prefix[] = "/var/db/timezone/zoneinfo";
-constexpr char old_prefix[] = "/usr/share/zoneinfo";
-constexpr char default_zone[] = "America/Los_Angeles";
-// Fixed on its own rather than joined, so the reset never depends on anything.
-constexpr char default_target[] = "/var/db/timezone/zoneinfo/America/Los_Angeles";
 
 // Byte prefix test; no separator is required after the prefix.
 bool starts_with(const std::string& text, const std::string& prefix) {
@@ -24,21 +17,21 @@ bool starts_with(const std::string& text, const std::string& prefix) {
 
 void rewrite_or_throw() {
   std::string corrected;
-  const localtime_verdict verdict = localtime_rule(read_symlink(localtime_link), corrected);
+  const localtime_verdict verdict = localtime_rule(read_symlink(paths::localtime_link), corrected);
   if (verdict == localtime_verdict::keep) return;
   if (verdict == localtime_verdict::reset) throw -1;
   warn("Correcting localtime link to %s", corrected.c_str());
   if (!exists(corrected)) throw -1;
-  std::remove(localtime_link);
-  create_symlink(corrected, localtime_link);
+  remove_quietly(paths::localtime_link);
+  create_symlink(corrected, paths::localtime_link);
 }
 
 }  // namespace
 
 localtime_verdict localtime_rule(const std::string& target, std::string& corrected) {
-  if (starts_with(target, zoneinfo_prefix)) return localtime_verdict::keep;
-  if (!starts_with(target, old_prefix)) return localtime_verdict::reset;
-  corrected = zoneinfo_prefix + target.substr(sizeof old_prefix - 1);
+  if (starts_with(target, paths::zoneinfo_link)) return localtime_verdict::keep;
+  if (!starts_with(target, paths::old_zoneinfo)) return localtime_verdict::reset;
+  corrected = paths::zoneinfo_link + target.substr(sizeof paths::old_zoneinfo - 1);
   return localtime_verdict::rewrite;
 }
 
@@ -46,9 +39,9 @@ void check_localtime_link() {
   try {
     rewrite_or_throw();
   } catch (...) {
-    warn("localtime link invalid; resetting to %s", default_zone);
-    std::remove(localtime_link);
-    create_symlink(default_target, localtime_link);
+    warn("localtime link invalid; resetting to %s", paths::default_zone);
+    remove_quietly(paths::localtime_link);
+    create_symlink(paths::default_localtime_target, paths::localtime_link);
   }
 }
 

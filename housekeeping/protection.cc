@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "fs/paths.h"
 #include "platform/protection.h"
 
 namespace vell {
@@ -15,8 +16,8 @@ void set_directory_protection(const std::string& path) {
 }
 
 void protect_data_directories() {
-  set_directory_protection("/var/db/timezone/");
-  set_directory_protection("/var/db/timezone/tz/");
+  set_directory_protection(paths::data_dir);
+  set_directory_protection(paths::downloads);
 }
 
 }  // namespace vell
