@@ -41,13 +41,16 @@ struct start {
   std::vector<std::string> links;
 };
 
-const char* const changed_by_a_start[] = {
-    "/var/db/timezone/zoneinfo", "/var/db/timezone/icutz",          "/var/db/timezone/tz_latest",
-    "/var/db/timezone/needs_cleanup", "/var/db/timezone/TZVersionDiffRecord", "/var/db/timezone/localtime"};
+const char* const changed_by_a_start[] = {"/var/db/timezone/zoneinfo",
+                                          "/var/db/timezone/icutz",
+                                          "/var/db/timezone/tz_latest",
+                                          "/var/db/timezone/needs_cleanup",
+                                          "/var/db/timezone/TZVersionDiffRecord",
+                                          "/var/db/timezone/localtime"};
 
 void prepare(const start& s) {
   for (const char* path : changed_by_a_start) unlink(path);
-  for (const std::string& entry : s.links) sandbox::lay_out({entry});
+  for (const std::string& entry : s.links) vell::testing::lay_out(entry);
 }
 
 // Runs `argv` with its output discarded; returns wall nanoseconds.
@@ -120,8 +123,11 @@ std::string profile_dir;
 long instructions(const program& p, const start& s, const std::string& scratch) {
   prepare(s);
   std::string out = "/dev/null";
-  if (!profile_dir.empty()) out = profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." + std::to_string(s.links.size()) + ".callgrind";
-  run({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out, p.path}, scratch.c_str());
+  if (!profile_dir.empty())
+    out = profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
+          std::to_string(s.links.size()) + ".callgrind";
+  run({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out, p.path},
+      scratch.c_str());
   const std::string log = read_file(scratch);
   const size_t at = log.find("Collected : ");
   return at == std::string::npos ? -1 : std::atol(log.c_str() + at + 12);
@@ -135,8 +141,10 @@ std::pair<int, int> system_calls(const program& p, const start& s, const std::st
   int before = 0, after = 0;
   bool started = false;
   for (std::string line; std::getline(trace, line);) {
-    if (line.find("+++") != std::string::npos || line.find("resumed>") != std::string::npos) continue;
-    started = started || line.find("\"/var/db") != std::string::npos || line.find("\"/usr/share") != std::string::npos;
+    if (line.find("+++") != std::string::npos || line.find("resumed>") != std::string::npos)
+      continue;
+    started = started || line.find("\"/var/db") != std::string::npos ||
+              line.find("\"/usr/share") != std::string::npos;
     ++(started ? after : before);
   }
   return {before, after};
@@ -169,18 +177,22 @@ int main(int argc, char** argv) {
     }
   }
   const std::string dir = BENCH_DIR;
-  const std::vector<program> programs = {{"vell", vell_path},
-                                         {"C floor", dir + "/c_floor"},
-                                         {"library floor, libstdc++", dir + "/library_floor_libstdcxx"},
-                                         {"library floor, libc++", dir + "/library_floor_libcxx"}};
+  const std::vector<program> programs = {
+      {"vell", vell_path},
+      {"C floor", dir + "/c_floor"},
+      {"library floor, libstdc++", dir + "/library_floor_libstdcxx"},
+      {"library floor, libc++", dir + "/library_floor_libcxx"}};
   const std::string d = "/var/db/timezone/tz/2016d.1.0";
-  const std::string localtime = "/var/db/timezone/localtime -> /var/db/timezone/zoneinfo/America/Los_Angeles";
+  const std::string localtime =
+      "/var/db/timezone/localtime -> /var/db/timezone/zoneinfo/America/Los_Angeles";
   const std::vector<start> starts = {
       {"steady start (links and tz_latest name 2016d.1.0)",
-       {"/var/db/timezone/zoneinfo -> " + d + "/zoneinfo", "/var/db/timezone/icutz -> " + d + "/icutz",
-        "/var/db/timezone/tz_latest -> " + d, localtime}},
+       {"/var/db/timezone/zoneinfo -> " + d + "/zoneinfo",
+        "/var/db/timezone/icutz -> " + d + "/icutz", "/var/db/timezone/tz_latest -> " + d,
+        localtime}},
       {"promotion (links name the system data, tz_latest 2016d.1.0)",
-       {"/var/db/timezone/zoneinfo -> /usr/share/zoneinfo.default", "/var/db/timezone/tz_latest -> " + d, localtime}},
+       {"/var/db/timezone/zoneinfo -> /usr/share/zoneinfo.default",
+        "/var/db/timezone/tz_latest -> " + d, localtime}},
       {"first start with reset (no links but tz_latest)", {"/var/db/timezone/tz_latest -> " + d}},
   };
   char scratch_name[] = "/tmp/vell-bench.XXXXXX";
@@ -189,7 +201,8 @@ int main(int argc, char** argv) {
 
   sandbox box;
   vell::testing::lay_out_device();
-  std::printf("%d interleaved runs per program and start; floors are those of the steady start.\n", runs);
+  std::printf("%d interleaved runs per program and start; floors are those of the steady start.\n",
+              runs);
   for (const start& s : starts) {
     std::map<std::string, figures> results;
     for (const program& p : programs) {
@@ -204,19 +217,21 @@ int main(int argc, char** argv) {
         f.wall.push_back(run({p.path}));
       }
     }
-    std::printf("\n%s\n  %-26s %14s %12s %22s %10s\n", s.name, "program", "instructions", "wall (us)",
-                "syscalls start+own", "peak KiB");
+    std::printf("\n%s\n  %-26s %14s %12s %22s %10s\n", s.name, "program", "instructions",
+                "wall (us)", "syscalls start+own", "peak KiB");
     for (const program& p : programs) {
       const figures& f = results[p.name];
-      std::printf("  %-26s %14ld %12.1f %14d + %-6d %10ld\n", p.name, f.instructions, f.median_us(), f.calls.first,
-                  f.calls.second, f.rss_kib);
+      std::printf("  %-26s %14ld %12.1f %14d + %-6d %10ld\n", p.name, f.instructions, f.median_us(),
+                  f.calls.first, f.calls.second, f.rss_kib);
     }
     const figures& vell = results["vell"];
     const figures& c_floor = results["C floor"];
-    const figures& library = std::min(results["library floor, libstdc++"], results["library floor, libc++"],
-                                      [](const figures& a, const figures& b) { return a.instructions < b.instructions; });
-    std::printf("  vell / C floor: wall %.2fx    vell / cheaper library floor: instructions %.2fx\n",
-                vell.median_us() / c_floor.median_us(), double(vell.instructions) / library.instructions);
+    const figures& library = std::min(
+        results["library floor, libstdc++"], results["library floor, libc++"],
+        [](const figures& a, const figures& b) { return a.instructions < b.instructions; });
+    std::printf(
+        "  vell / C floor: wall %.2fx    vell / cheaper library floor: instructions %.2fx\n",
+        vell.median_us() / c_floor.median_us(), double(vell.instructions) / library.instructions);
   }
   unlink(scratch_name);
   return 0;

@@ -7,7 +7,8 @@
 #include <string>
 
 int main() {
-  const char* const files[] = {"/usr/share/zoneinfo.default/+VERSION", "/usr/share/icu/icutzformat.txt",
+  const char* const files[] = {"/usr/share/zoneinfo.default/+VERSION",
+                               "/usr/share/icu/icutzformat.txt",
                                "/var/db/timezone/tz/2016d.1.0/zoneinfo/+VERSION",
                                "/var/db/timezone/tz/2016d.1.0/zoneinfo/+VERSION"};
   std::string words[4];
@@ -25,7 +26,8 @@ int main() {
   for (int i = 0; i < 2; ++i) {
     const std::regex pattern("icutz([0-9]+[lbe])\\.dat");
     std::cmatch match;
-    if (std::regex_match("icutz44l.dat", match, pattern)) sum += static_cast<int>(match[1].length());
+    if (std::regex_match("icutz44l.dat", match, pattern))
+      sum += static_cast<int>(match[1].length());
   }
   return sum == 3 * 2016 + 6 ? 0 : 1;
 }

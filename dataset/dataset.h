@@ -27,7 +27,9 @@ class vell_dataset {
   const vell_version& version() const { return parsed_version_; }
   const std::string& path() const { return path_; }
   /// Zoneinfo first, then ICU.
-  const std::vector<std::shared_ptr<vell_dataset_component>>& components() const { return components_; }
+  const std::vector<std::shared_ptr<vell_dataset_component>>& components() const {
+    return components_;
+  }
 
   /// Byte-for-byte equality of the paths; nothing is normalised.
   bool same_path(const vell_dataset& other) const;

@@ -15,7 +15,9 @@ void reset_to_system() {
 
 std::string read_latest_link() { return read_symlink(paths::latest_link); }
 
-std::string current_dataset_path() { return dataset_path_of_link(read_symlink(paths::zoneinfo_link)); }
+std::string current_dataset_path() {
+  return dataset_path_of_link(read_symlink(paths::zoneinfo_link));
+}
 
 std::string dataset_path_of_link(const std::string& target) {
   if (target == paths::system_zoneinfo) return std::string();

@@ -40,11 +40,13 @@ void parse_version(vell_version& v, const std::string& s) {
 }
 
 bool operator>(const vell_version& a, const vell_version& b) {
-  return std::tie(a.year, a.letters, a.major, a.minor) > std::tie(b.year, b.letters, b.major, b.minor);
+  return std::tie(a.year, a.letters, a.major, a.minor) >
+         std::tie(b.year, b.letters, b.major, b.minor);
 }
 
 bool operator==(const vell_version& a, const vell_version& b) {
-  return std::tie(a.year, a.letters, a.major, a.minor) == std::tie(b.year, b.letters, b.major, b.minor);
+  return std::tie(a.year, a.letters, a.major, a.minor) ==
+         std::tie(b.year, b.letters, b.major, b.minor);
 }
 
 }  // namespace vell

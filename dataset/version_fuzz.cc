@@ -17,7 +17,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   }
   const vell::vell_version unknown;
   if (version == unknown) return 0;  // did not parse
-  if (!(version > unknown) || unknown > version || version > version || !(version == version)) __builtin_trap();
+  if (!(version > unknown) || unknown > version || version > version || !(version == version))
+    __builtin_trap();
   if (version.year < 0 || version.letters.empty() ||
       version.letters.find_first_not_of("abcdefghijklmnopqrstuvwxyz") != std::string::npos ||
       text.find(version.letters) == std::string::npos)

@@ -1,7 +1,6 @@
 #include "driver/selection.h"
 
 #include <err.h>
-
 #include <unistd.h>
 
 #include <string>

@@ -30,8 +30,8 @@ std::string read_first_word(const std::string& path) {
   std::string text(first_word_bound, '\0');
   size_t length = 0;
   if (is_own_regular_file(fd, false)) {
-    for (ssize_t n; length < text.size() &&
-                    (n = read(fd, text.data() + length, text.size() - length)) != 0;) {
+    for (ssize_t n;
+         length < text.size() && (n = read(fd, text.data() + length, text.size() - length)) != 0;) {
       if (n < 0 && errno == EINTR) continue;
       if (n < 0) break;
       length += n;

@@ -2,44 +2,32 @@
 
 #include <gtest/gtest.h>
 
-#include "testing/sandbox.h"
-
 namespace vell {
 namespace {
 
-using namespace vell::testing;
-
-// The prefix tests themselves are held by localtime_fuzz.cc; these are the
-// outcomes on disk and the messages.
-TEST(LocalTime, OutcomeTable) {
-  const std::string link = "/var/db/timezone/localtime", zoneinfo = "/var/db/timezone/zoneinfo";
-  const std::string reset = "localtime link invalid; resetting to America/Los_Angeles: *";
-  const std::string not_a_link = "read_symlink: /var/db/timezone/localtime: Invalid argument";
-  const std::string to_default = "-> /var/db/timezone/zoneinfo/America/Los_Angeles";
-  auto correcting = [&](const std::string& zone) { return "Correcting localtime link to " + zoneinfo + zone + ": *"; };
+// How a local-time link target is treated, and what a rewrite gives.
+TEST(LocaltimeRule, Table) {
+  const std::string zoneinfo = "/var/db/timezone/zoneinfo";
   const struct {
-    const char* name;
-    std::string at_start;  // what lay_out puts at the link's path; "" for nothing
-    std::string after;
-    std::vector<std::string> messages;
+    std::string target;
+    localtime_verdict verdict;
+    std::string corrected;
   } cases[] = {
-      {"present form kept, file missing", link + " -> " + zoneinfo + "/Nowhere", "-> " + zoneinfo + "/Nowhere", {}},
-      {"old form rewritten", link + " -> /usr/share/zoneinfo/Europe/Paris", "-> " + zoneinfo + "/Europe/Paris",
-       {correcting("/Europe/Paris")}},
-      {"old form, zone missing", link + " -> /usr/share/zoneinfo/Nowhere/Missing", to_default,
-       {correcting("/Nowhere/Missing"), reset}},
-      {"old prefix, no separator", link + " -> /usr/share/zoneinfo.default/Europe/Paris", to_default,
-       {correcting(".default/Europe/Paris"), reset}},
-      {"no link", "", to_default, {reset}},
-      {"regular file", link + " = x", to_default, {not_a_link, reset}},
+      {zoneinfo + "/Europe/Paris", localtime_verdict::keep, ""},
+      {zoneinfo, localtime_verdict::keep, ""},
+      {zoneinfo + ".old", localtime_verdict::keep, ""},
+      {"/usr/share/zoneinfo/Europe/Paris", localtime_verdict::rewrite, zoneinfo + "/Europe/Paris"},
+      {"/usr/share/zoneinfo", localtime_verdict::rewrite, zoneinfo},
+      {"/usr/share/zoneinfo.default/UTC", localtime_verdict::rewrite, zoneinfo + ".default/UTC"},
+      {"/usr/share/zoneinf", localtime_verdict::reset, ""},
+      {"/var/db/timezone/zoneinf", localtime_verdict::reset, ""},
+      {"Europe/Paris", localtime_verdict::reset, ""},
+      {"", localtime_verdict::reset, ""},
   };
   for (const auto& c : cases) {
-    SCOPED_TRACE(c.name);
-    sandbox box;
-    sandbox::lay_out({"/usr/share/zoneinfo.default/Europe/Paris = TZif", zoneinfo + " -> /usr/share/zoneinfo.default"});
-    if (!c.at_start.empty()) sandbox::lay_out({c.at_start});
-    expect_messages(messages_of(check_localtime_link), c.messages);
-    EXPECT_EQ(show(link), c.after);
+    std::string corrected;
+    EXPECT_EQ(localtime_rule(c.target, corrected), c.verdict) << c.target;
+    EXPECT_EQ(corrected, c.corrected) << c.target;
   }
 }
 
