@@ -76,6 +76,11 @@ sandbox::~sandbox() {
 }
 
 void lay_out(const std::string& entry) {
+  if (const size_t hard = entry.find(" => "); hard != std::string::npos) {
+    make_room(entry.substr(0, hard));
+    if (link(entry.substr(hard + 4).c_str(), entry.substr(0, hard).c_str()) != 0) fail("link");
+    return;
+  }
   const size_t arrow = entry.find(" -> "), equals = entry.find(" = ");
   if (arrow != std::string::npos && arrow < equals) {
     const std::string path = entry.substr(0, arrow);

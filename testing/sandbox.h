@@ -28,6 +28,7 @@ class sandbox {
 ///   "/a/file = text", "/a/f [0640] = text"  a file holding the text
 ///   "/a/fifo fifo"                     a FIFO
 ///   "/a/gone absent"                   nothing
+///   "/a/name => /b/file"               a further hard link to a file
 void lay_out(const std::string& entry);
 
 /// The sample device: system data 2016c (its "+VERSION" holds two words),

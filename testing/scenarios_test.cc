@@ -1,6 +1,8 @@
 // Runs every scenario in testing/scenarios (the format is in scenario.h).
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
+
 #include <filesystem>
 
 #include "testing/sandbox.h"
@@ -54,7 +56,13 @@ void run(const scenario& s) {
     } else if (step == "usable") {
       EXPECT_EQ(unusable_links(), "");
     } else if (started && step.starts_with("/")) {
-      const auto [path, want] = expectation(step);
+      auto [path, want] = expectation(step);
+      if (const size_t mode = path.find(" ["); mode != std::string::npos) {
+        struct stat st;
+        EXPECT_EQ(lstat(path.substr(0, mode).c_str(), &st) == 0 ? st.st_mode & 07777 : 0,
+                  std::stoul(path.substr(mode + 2), nullptr, 8)) << path;
+        path.erase(mode);
+      }
       EXPECT_EQ(show(path), want) << path;
     }
   }
