@@ -34,7 +34,7 @@ vell_icu::vell_icu(const std::string& dataset_path)
 }
 
 void vell_icu::find_schema_in_directory() {
-  const std::regex pattern("icutz([0-9]+[lbe])\\.dat");
+  static const std::regex pattern("icutz([0-9]+[lbe])\\.dat");  // compiled once per start
   char* const roots[] = {const_cast<char*>(directory_.c_str()), nullptr};
   const std::unique_ptr<FTS, fts_closer> walk(
       fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));

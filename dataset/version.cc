@@ -11,8 +11,9 @@ namespace vell {
 vell_version::vell_version(const std::string& text) { parse_version(*this, text); }
 
 void parse_version(vell_version& v, const std::string& s) {
-  // Compiled on every call: one version is parsed per dataset built.
-  const std::regex pattern("([0-9]+)([a-z]+)(?:\\.([0-9]+))?(?:\\.([0-9]+))?");
+  // Compiled once: a start parses up to four versions, and compiling costs
+  // more than matching.
+  static const std::regex pattern("([0-9]+)([a-z]+)(?:\\.([0-9]+))?(?:\\.([0-9]+))?");
   try {
     std::smatch results;
     if (!std::regex_match(s, results, pattern) || results.size() != 5) {
