@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <stdexcept>
+#include <string_view>
 
 #include "dataset/icu.h"
 #include "dataset/zoneinfo.h"
@@ -12,8 +13,8 @@
 namespace vell {
 
 bool is_dataset_path(const std::string& path) {
-  const std::string prefix = paths::downloads;
-  return path.size() > prefix.size() && path.compare(0, prefix.size(), prefix) == 0;
+  return path.starts_with(paths::downloads) &&
+         path.size() > std::string_view(paths::downloads).size();
 }
 
 vell_dataset::vell_dataset() { create_components(); }
@@ -26,7 +27,7 @@ void vell_dataset::create_components() {
   if (path_.empty()) {
     version_text_ = zoneinfo->version() + ".1.0";
   } else if (is_dataset_path(path_)) {
-    version_text_ = path_.substr(sizeof paths::downloads - 1);
+    version_text_ = path_.substr(std::string_view(paths::downloads).size());
   } else {
     warn("vell_dataset::create_components: bad path %s", path_.c_str());
     throw std::invalid_argument("badpath");

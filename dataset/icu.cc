@@ -14,15 +14,6 @@
 #include "fs/small_files.h"
 
 namespace vell {
-namespace {
-
-// Closing the walk also returns to the directory it started in.
-struct fts_closer {
-  void operator()(FTS* walk) const { fts_close(walk); }
-};
-
-}  // namespace
-
 vell_icu::vell_icu(const std::string& dataset_path)
     : vell_dataset_component(dataset_path),
       directory_(dataset_path.empty() ? paths::system_icu : dataset_path + "/icutz") {
@@ -36,8 +27,9 @@ vell_icu::vell_icu(const std::string& dataset_path)
 void vell_icu::find_schema_in_directory() {
   static const std::regex pattern("icutz([0-9]+[lbe])\\.dat");  // compiled once per start
   char* const roots[] = {const_cast<char*>(directory_.c_str()), nullptr};
-  const std::unique_ptr<FTS, fts_closer> walk(
-      fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr));
+  // Closing the walk, however the loop ends, also returns to the directory it started in.
+  const std::unique_ptr<FTS, decltype(&fts_close)> walk(
+      fts_open(roots, FTS_COMFOLLOW | FTS_PHYSICAL | FTS_XDEV, nullptr), fts_close);
   if (!walk) {
     const int error = errno;
     warn("tz_icu::initialize: fts_open of %s failed, %s", directory_.c_str(), strerror(error));

@@ -1,9 +1,6 @@
 #include "driver/selection.h"
 
 #include <err.h>
-#include <unistd.h>
-
-#include <string>
 
 #include "dataset/links.h"
 #include "fs/paths.h"
@@ -38,13 +35,7 @@ void promote_latest_update(const std::string& latest_path, const vell_dataset& s
 
 void write_version_diff_record(const std::string& from, const std::string& to) {
   // A record that cannot be written is not worth a message: nothing reads it at boot.
-  const int fd = open_own_file(paths::version_diff_record, no_protection_class, 0666);
-  if (fd < 0) return;
-  const std::string text = from + '_' + to;
-  // Truncated only once the file is known to be ours.
-  [[maybe_unused]] const ssize_t written =
-      ftruncate(fd, 0) == 0 ? write(fd, text.data(), text.size()) : -1;
-  close(fd);
+  replace_own_file(paths::version_diff_record, from + '_' + to);
 }
 
 }  // namespace vell

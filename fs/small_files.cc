@@ -1,6 +1,5 @@
 #include "fs/small_files.h"
 
-#include <errno.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -10,16 +9,16 @@
 namespace vell {
 namespace {
 
-bool is_blank(char c) { return c == ' ' || (c >= '\t' && c <= '\r'); }
+constexpr int own_file_flags = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 
-// Only a lone regular file is ours to read or write; errno says why not.
-bool is_own_regular_file(int fd, bool single_name) {
+// A regular file; for one that vell writes, also under this one name only.
+bool is_regular(int fd, bool sole_name) {
   struct stat status;
-  if (fstat(fd, &status) != 0) return false;
-  if (S_ISREG(status.st_mode) && (!single_name || status.st_nlink == 1)) return true;
-  errno = S_ISREG(status.st_mode) ? EMLINK : EINVAL;
-  return false;
+  return fstat(fd, &status) == 0 && S_ISREG(status.st_mode) && (!sole_name || status.st_nlink == 1);
 }
+
+// Closes `fd`; true when `done` and the close succeeded.
+bool close_after(int fd, bool done) { return close(fd) == 0 && done; }
 
 }  // namespace
 
@@ -28,34 +27,27 @@ std::string read_first_word(const std::string& path) {
   const int fd = open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
   if (fd < 0) return std::string();
   std::string text(first_word_bound, '\0');
-  size_t length = 0;
-  if (is_own_regular_file(fd, false)) {
-    for (ssize_t n;
-         length < text.size() && (n = read(fd, text.data() + length, text.size() - length)) != 0;) {
-      if (n < 0 && errno == EINTR) continue;
-      if (n < 0) break;
-      length += n;
-    }
-  }
+  // One read: a regular file gives all it holds up to the bound.
+  const ssize_t length = is_regular(fd, false) ? read(fd, text.data(), text.size()) : -1;
   close(fd);
-  text.resize(length);
-  size_t begin = 0;
-  while (begin < text.size() && is_blank(text[begin])) ++begin;
-  size_t end = begin;
-  while (end < text.size() && !is_blank(text[end])) ++end;
-  return text.substr(begin, end - begin);
+  text.resize(length < 0 ? 0 : length);
+  const char blanks[] = " \t\n\v\f\r";
+  const size_t begin = text.find_first_not_of(blanks);
+  if (begin == std::string::npos) return std::string();
+  return text.substr(begin, text.find_first_of(blanks, begin) - begin);
 }
 
-int open_own_file(const std::string& path, int protection_class, unsigned mode) {
-  const int flags = O_WRONLY | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
-  const int fd = protection_class == no_protection_class
-                     ? open(path.c_str(), flags, mode)
-                     : platform::open_protected(path.c_str(), flags, protection_class, mode);
-  if (fd < 0 || is_own_regular_file(fd, true)) return fd;
-  const int error = errno;
-  close(fd);
-  errno = error;
-  return -1;
+bool touch_own_file(const std::string& path, int protection_class) {
+  const int fd = platform::open_protected(path.c_str(), own_file_flags, protection_class, 0666);
+  return fd >= 0 && close_after(fd, is_regular(fd, true));
+}
+
+bool replace_own_file(const std::string& path, const std::string& contents) {
+  const int fd = open(path.c_str(), own_file_flags, 0666);
+  // Truncated only once the file is known to be ours.
+  return fd >= 0 && close_after(fd, is_regular(fd, true) && ftruncate(fd, 0) == 0 &&
+                                        write(fd, contents.data(), contents.size()) ==
+                                            static_cast<ssize_t>(contents.size()));
 }
 
 }  // namespace vell

@@ -14,21 +14,24 @@ namespace vell {
 /// target already has, and keeps every regular-expression engine in its depth.
 inline constexpr std::size_t first_word_bound = 1024;
 
-inline constexpr int no_protection_class = -1;
-
 /// The first blank-separated word among the first first_word_bound bytes of
 /// the regular file at `path` (links followed), cut at the bound. Anything
 /// that is not a regular file, cannot be opened without blocking or cannot be
 /// read counts as missing and gives "". Never prints, never throws.
 std::string read_first_word(const std::string& path);
 
-/// Opens `path` for writing when it is, or can be created as, a regular file
-/// of its own: never through a link at `path`, never a FIFO or device, never
-/// a file with further hard links, and without blocking. A new file gets
-/// `mode` (less the umask) and the data-protection class `protection_class`
-/// (none for no_protection_class).
-/// Returns the descriptor, or -1 with errno set.
-int open_own_file(const std::string& path, int protection_class, unsigned mode);
+// The two writes below touch `path` only when it is, or can be created as, a
+// regular file of its own: never through a link at `path`, never a FIFO or
+// device, never a file with further hard links, and without blocking. A new
+// file gets mode 0666 less the umask. They return false when that, or the
+// write, fails; they never print.
+
+/// Creates an empty file at `path` with the data-protection class
+/// `protection_class`, or leaves the file there as it is.
+bool touch_own_file(const std::string& path, int protection_class);
+
+/// Makes the file at `path` hold exactly `contents`.
+bool replace_own_file(const std::string& path, const std::string& contents);
 
 }  // namespace vell
 

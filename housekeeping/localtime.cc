@@ -3,17 +3,13 @@
 #include <err.h>
 
 #include <string>
+#include <string_view>
 
 #include "fs/path_ops.h"
 #include "fs/paths.h"
 
 namespace vell {
 namespace {
-
-// Byte prefix test; no separator is required after the prefix.
-bool starts_with(const std::string& text, const std::string& prefix) {
-  return text.compare(0, prefix.size(), prefix) == 0 && text.size() >= prefix.size();
-}
 
 void rewrite_or_throw() {
   std::string corrected;
@@ -29,9 +25,10 @@ void rewrite_or_throw() {
 }  // namespace
 
 localtime_verdict localtime_rule(const std::string& target, std::string& corrected) {
-  if (starts_with(target, paths::zoneinfo_link)) return localtime_verdict::keep;
-  if (!starts_with(target, paths::old_zoneinfo)) return localtime_verdict::reset;
-  corrected = paths::zoneinfo_link + target.substr(sizeof paths::old_zoneinfo - 1);
+  // Byte prefixes: no separator is required after them.
+  if (target.starts_with(paths::zoneinfo_link)) return localtime_verdict::keep;
+  if (!target.starts_with(paths::old_zoneinfo)) return localtime_verdict::reset;
+  corrected = paths::zoneinfo_link + target.substr(std::string_view(paths::old_zoneinfo).size());
   return localtime_verdict::rewrite;
 }
 
