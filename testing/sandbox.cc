@@ -1,15 +1,18 @@
 #include "testing/sandbox.h"
 
 #include <fcntl.h>
+#include <gtest/gtest.h>
 #include <sched.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
@@ -25,8 +28,13 @@ const char* const covered[] = {"/var", "/usr/share"};
 }
 
 void write_file(const std::string& path, const std::string& text) {
-  std::ofstream out(path, std::ios::binary);
-  if (!(out << text)) fail("write " + path);
+  if (!(std::ofstream(path, std::ios::binary) << text)) fail("write " + path);
+}
+
+std::string read_file(const std::string& path) {
+  std::ostringstream text;
+  text << std::ifstream(path, std::ios::binary).rdbuf();
+  return text.str();
 }
 
 void enter_private_namespace() {
@@ -61,6 +69,34 @@ void make_room(const std::string& path) {
   }
 }
 
+std::string expand(const std::string& line) {
+  std::string out;
+  for (size_t i = 0; i < line.size(); ++i) {
+    const size_t star = line.find('*', i), close = line.find('}', i);
+    if (line[i] == '@') {
+      out += "/var/db/timezone/";
+    } else if (line[i] == '{' && star == i + 2 && close != std::string::npos) {
+      out.append(std::stoul(line.substr(i + 3)), line[i + 1]);
+      i = close;
+    } else {
+      out += line[i];
+    }
+  }
+  return out;
+}
+
+// A message without the error text that warn() puts after its last ": ",
+// and without the blanks before it.
+std::string without_error_text(const std::string& message) {
+  const std::string text = message.substr(0, message.rfind(": "));
+  return text.substr(0, text.find_last_not_of(' ') + 1);
+}
+
+std::string dataset_part(const std::string& dataset, const std::string& part) {
+  return dataset == "system" ? "/usr/share/zoneinfo.default"
+                             : "/var/db/timezone/tz/" + dataset + part;
+}
+
 }  // namespace
 
 sandbox::sandbox() {
@@ -76,43 +112,42 @@ sandbox::~sandbox() {
 }
 
 void lay_out(const std::string& entry) {
-  if (const size_t hard = entry.find(" => "); hard != std::string::npos) {
-    make_room(entry.substr(0, hard));
-    if (link(entry.substr(hard + 4).c_str(), entry.substr(0, hard).c_str()) != 0) fail("link");
-    return;
+  const size_t blank = entry.find(' ');
+  std::string path = entry.substr(0, blank);
+  std::string rest = blank == std::string::npos ? "" : entry.substr(blank + 1);
+  mode_t mode = path.ends_with('/') ? 0755 : 0644;
+  if (rest.starts_with("[")) {
+    mode = std::stoul(rest.substr(1), nullptr, 8);
+    rest.erase(0, rest.find(']') + 2);
   }
-  const size_t arrow = entry.find(" -> "), equals = entry.find(" = ");
-  if (arrow != std::string::npos && arrow < equals) {
-    const std::string path = entry.substr(0, arrow);
-    make_room(path);
-    if (symlink(entry.substr(arrow + 4).c_str(), path.c_str()) != 0) fail("symlink " + path);
-    return;
-  }
-  std::string path = entry.substr(0, equals);
-  mode_t mode = equals == std::string::npos ? 0755 : 0644;
-  if (const size_t bracket = path.rfind(" ["); bracket != std::string::npos) {
-    mode = std::stoul(path.substr(bracket + 2), nullptr, 8);
-    path.erase(bracket);
-  }
-  if (path.ends_with(" absent")) {
-    make_room(path.erase(path.size() - 7));
-    return;
-  }
-  if (path.ends_with(" fifo")) {
-    path.erase(path.size() - 5);
-    make_room(path);
-    if (mkfifo(path.c_str(), 0644) != 0) fail("mkfifo " + path);
-  } else if (equals != std::string::npos) {
-    make_room(path);
-    write_file(path, entry.substr(equals + 3));
-  } else if (path.ends_with('/')) {
-    path.pop_back();
-    make_room(path);
-    if (mkdir(path.c_str(), mode) != 0 && errno != EEXIST) fail("mkdir " + path);
-  } else {
+  if (path.ends_with('/')) path.pop_back();
+  make_room(path);
+  bool made = true;
+  if (rest.starts_with("-> ")) {
+    made = symlink(rest.c_str() + 3, path.c_str()) == 0;
+  } else if (rest.starts_with("=> ")) {
+    made = link(rest.c_str() + 3, path.c_str()) == 0;
+  } else if (rest.starts_with("=")) {
+    write_file(path, rest.substr(std::min<size_t>(2, rest.size())));
+  } else if (rest == "fifo") {
+    made = mkfifo(path.c_str(), mode) == 0;
+  } else if (rest.empty()) {
+    made = mkdir(path.c_str(), mode) == 0 || errno == EEXIST;
+  } else if (rest != "absent") {
     throw std::invalid_argument("lay_out: cannot read " + entry);
   }
-  if (chmod(path.c_str(), mode) != 0) fail("chmod " + path);
+  if (!made || (rest.starts_with("=") && chmod(path.c_str(), mode) != 0)) fail(entry);
+}
+
+std::string entry_at(const std::string& path, bool with_mode) {
+  struct stat st;
+  if (lstat(path.c_str(), &st) != 0) return path + " absent";
+  char mode[16] = "";
+  if (with_mode) std::snprintf(mode, sizeof mode, " [%04o]", st.st_mode & 07777);
+  if (S_ISDIR(st.st_mode)) return path + "/";
+  if (S_ISFIFO(st.st_mode)) return path + " fifo";
+  if (S_ISLNK(st.st_mode)) return path + " -> " + std::filesystem::read_symlink(path).string();
+  return path + mode + " = " + read_file(path);
 }
 
 void lay_out_device() {
@@ -133,38 +168,6 @@ void lay_out_device() {
   }
 }
 
-std::string show(const std::string& path) {
-  struct stat st;
-  if (lstat(path.c_str(), &st) != 0) return "absent";
-  if (S_ISDIR(st.st_mode)) return "/";
-  if (S_ISFIFO(st.st_mode)) return "fifo";
-  if (S_ISLNK(st.st_mode)) {
-    char target[4096];
-    const ssize_t n = readlink(path.c_str(), target, sizeof target);
-    return "-> " + std::string(target, n < 0 ? 0 : n);
-  }
-  std::ostringstream text;
-  text << std::ifstream(path, std::ios::binary).rdbuf();
-  return "= " + text.str();
-}
-
-std::string unusable_links() {
-  const std::string zoneinfo = show("/var/db/timezone/zoneinfo");
-  const std::string icutz = show("/var/db/timezone/icutz");
-  std::string dataset;
-  for (const char* version : {"2016a.1.0", "2016b.1.0", "2016d.1.0", "2016e.1.0"}) {
-    if (zoneinfo == "-> /var/db/timezone/tz/" + std::string(version) + "/zoneinfo")
-      dataset = "/var/db/timezone/tz/" + std::string(version);
-  }
-  if (dataset.empty() && zoneinfo != "-> /usr/share/zoneinfo.default")
-    return "zoneinfo " + zoneinfo;
-  if (icutz != (dataset.empty() ? "absent" : "-> " + dataset + "/icutz"))
-    return "icutz " + icutz + " beside zoneinfo " + zoneinfo;
-  if (!show("/var/db/timezone/localtime").starts_with("-> /var/db/timezone/zoneinfo"))
-    return "localtime " + show("/var/db/timezone/localtime");
-  return "";
-}
-
 run_result run_vell(const std::vector<std::string>& wrapper) {
   // testing/run-unprivileged moves the binary where an ordinary user can reach it.
   const char* moved = std::getenv("VELL_TEST_BINARY");
@@ -172,35 +175,92 @@ run_result run_vell(const std::vector<std::string>& wrapper) {
   for (const std::string& word : wrapper) argv.push_back(word.c_str());
   argv.push_back(moved != nullptr ? moved : VELL_BINARY);
   argv.push_back(nullptr);
-  int pipe_fds[2];
-  if (pipe2(pipe_fds, O_CLOEXEC) != 0) fail("pipe");
-  const pid_t child = fork();
+  FILE* messages = std::tmpfile();
+  const pid_t child = messages == nullptr ? -1 : fork();
   if (child < 0) fail("fork");
   if (child == 0) {
-    dup2(pipe_fds[1], 2);
+    dup2(fileno(messages), 2);
     dup2(open("/dev/null", O_RDONLY), 0);
     alarm(5);
     char* const no_environment[] = {nullptr};
     execve(argv[0], const_cast<char* const*>(argv.data()), no_environment);
     _exit(127);
   }
-  close(pipe_fds[1]);
-  std::string text;
-  char buffer[4096];
-  for (ssize_t n; (n = read(pipe_fds[0], buffer, sizeof buffer)) != 0;) {
-    if (n > 0) text.append(buffer, n);
-    if (n < 0 && errno != EINTR) break;
-  }
-  close(pipe_fds[0]);
   int wait_status = 0;
   while (waitpid(child, &wait_status, 0) < 0 && errno == EINTR) {
   }
   run_result result{WIFEXITED(wait_status) ? WEXITSTATUS(wait_status) : 128 + WTERMSIG(wait_status),
                     {}};
-  std::istringstream lines(text);
+  std::istringstream lines(read_file("/proc/self/fd/" + std::to_string(fileno(messages))));
+  std::fclose(messages);
   for (std::string line; std::getline(lines, line);)
     result.messages.push_back(line.starts_with("vell: ") ? line.substr(6) : line);
   return result;
+}
+
+std::vector<scenario> read_scenarios() {
+  std::vector<std::filesystem::path> files;
+  for (const auto& entry : std::filesystem::directory_iterator(VELL_SCENARIOS))
+    files.push_back(entry);
+  std::sort(files.begin(), files.end());
+  std::vector<scenario> all;
+  for (const auto& file : files) {
+    std::ifstream in(file);
+    std::string title, previous;
+    int number = 0;
+    for (std::string line; std::getline(in, line); previous = line) {
+      ++number;
+      if (line.starts_with("#") && !previous.starts_with("#")) title = line;
+      if (line == "device")
+        all.push_back({file.filename().string() + ":" + std::to_string(number) + " " + title, {}});
+      if (!line.empty() && !line.starts_with("#") && !all.empty())
+        all.back().steps.push_back(expand(line));
+    }
+  }
+  return all;
+}
+
+void play(const scenario& s, bool set_up_only) {
+  bool started = false;
+  for (size_t i = 0; i < s.steps.size(); ++i) {
+    const std::string& step = s.steps[i];
+    std::istringstream words(step);
+    std::string word, current, latest;
+    words >> word >> current >> latest;
+    if (step == "device") {
+      lay_out_device();
+    } else if (word == "links") {
+      if (current != "-")
+        lay_out("/var/db/timezone/zoneinfo -> " + dataset_part(current, "/zoneinfo"));
+      if (current != "-" && current != "system")
+        lay_out("/var/db/timezone/icutz -> " + dataset_part(current, "/icutz"));
+      if (latest != "-") lay_out("/var/db/timezone/tz_latest -> " + dataset_part(latest, ""));
+    } else if (word == "start") {
+      if (set_up_only) return;
+      started = true;
+      const run_result result = run_vell();
+      EXPECT_EQ(result.status, std::stoi(current)) << step;
+      std::string got, want;
+      for (const std::string& message : result.messages) got += without_error_text(message) + "\n";
+      while (i + 1 < s.steps.size() && s.steps[i + 1].starts_with("| "))
+        want += s.steps[++i].substr(2) + "\n";
+      EXPECT_EQ(got, want) << step;
+    } else if (word == "active") {
+      const bool system = current == "system";
+      EXPECT_EQ(entry_at("/var/db/timezone/zoneinfo"),
+                "/var/db/timezone/zoneinfo -> " + dataset_part(current, "/zoneinfo"));
+      EXPECT_EQ(entry_at("/var/db/timezone/icutz"),
+                "/var/db/timezone/icutz" +
+                    (system ? " absent" : " -> " + dataset_part(current, "/icutz")));
+    } else if (step.starts_with("/") && !started) {
+      lay_out(step);
+    } else if (step.starts_with("/")) {
+      std::string path = word;
+      if (path.size() > 1 && path.ends_with('/')) path.pop_back();
+      const std::string got = entry_at(path, current.starts_with("["));
+      EXPECT_EQ(got.substr(0, got.find_last_not_of(' ') + 1), step);
+    }
+  }
 }
 
 }  // namespace vell::testing
