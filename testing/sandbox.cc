@@ -211,7 +211,7 @@ std::vector<scenario> read_scenarios() {
     for (std::string line; std::getline(in, line); previous = line) {
       ++number;
       if (line.starts_with("#") && !previous.starts_with("#")) title = line;
-      if (line == "device")
+      if (line.starts_with("device"))
         all.push_back({file.filename().string() + ":" + std::to_string(number) + " " + title, {}});
       if (!line.empty() && !line.starts_with("#") && !all.empty())
         all.back().steps.push_back(expand(line));
@@ -227,9 +227,9 @@ void play(const scenario& s, bool set_up_only) {
     std::istringstream words(step);
     std::string word, current, latest;
     words >> word >> current >> latest;
-    if (step == "device") {
+    if (word == "device") {
       lay_out_device();
-    } else if (word == "links") {
+      if (current.empty()) continue;
       if (current != "-")
         lay_out("/var/db/timezone/zoneinfo -> " + dataset_part(current, "/zoneinfo"));
       if (current != "-" && current != "system")

@@ -3,12 +3,12 @@
 // host, and the scenarios played in it. Nothing here is used by vell itself.
 //
 // A scenario is whole starts of the real binary written as data, in a file of
-// testing/scenarios. Each begins with "device" (the sample device below); the
-// comment above it names it. Then, one step a line:
+// testing/scenarios. Each begins with "device [CURRENT LATEST]": the sample
+// device below, with zoneinfo and icutz linked to the download CURRENT (or
+// zoneinfo alone to "system") and tz_latest to the download LATEST ("-" for
+// no link). The comment above it names it. Then, one step a line:
 //   ENTRY                 before the first start: laid out (notation of lay_out);
 //                         after it: what must stand there ("PATH absent" too)
-//   links CURRENT LATEST  zoneinfo and icutz to a download, or zoneinfo alone to
-//                         "system"; tz_latest to a download; "-" for none
 //   start STATUS          one start, ending by itself with STATUS; it prints
 //   | MESSAGE             exactly these lines, each without its error text
 //   active DATASET        zoneinfo and icutz name DATASET (or "system")
