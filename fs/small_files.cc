@@ -42,12 +42,14 @@ bool touch_own_file(const std::string& path, int protection_class) {
   return fd >= 0 && close_after(fd, is_regular(fd, true));
 }
 
-bool replace_own_file(const std::string& path, const std::string& contents) {
+void replace_own_file(const std::string& path, const std::string& contents) {
   const int fd = open(path.c_str(), own_file_flags, 0666);
+  if (fd < 0) return;
   // Truncated only once the file is known to be ours.
-  return fd >= 0 && close_after(fd, is_regular(fd, true) && ftruncate(fd, 0) == 0 &&
-                                        write(fd, contents.data(), contents.size()) ==
-                                            static_cast<ssize_t>(contents.size()));
+  if (is_regular(fd, true) && ftruncate(fd, 0) == 0) {
+    [[maybe_unused]] const ssize_t written = write(fd, contents.data(), contents.size());
+  }
+  close(fd);
 }
 
 }  // namespace vell

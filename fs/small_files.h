@@ -23,15 +23,16 @@ std::string read_first_word(const std::string& path);
 // The two writes below touch `path` only when it is, or can be created as, a
 // regular file of its own: never through a link at `path`, never a FIFO or
 // device, never a file with further hard links, and without blocking. A new
-// file gets mode 0666 less the umask. They return false when that, or the
-// write, fails; they never print.
+// file gets mode 0666 less the umask. They never print.
 
 /// Creates an empty file at `path` with the data-protection class
-/// `protection_class`, or leaves the file there as it is.
+/// `protection_class`, or leaves the file there as it is. False when that
+/// cannot be done.
 bool touch_own_file(const std::string& path, int protection_class);
 
-/// Makes the file at `path` hold exactly `contents`.
-bool replace_own_file(const std::string& path, const std::string& contents);
+/// Makes the file at `path` hold `contents`, as far as it can; nothing
+/// reports a failure.
+void replace_own_file(const std::string& path, const std::string& contents);
 
 }  // namespace vell
 
