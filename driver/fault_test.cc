@@ -4,6 +4,7 @@
 // reached a fixed point, and no downloaded or system data may have changed.
 // The points where that cannot hold are the scenario's "known" lines
 // ("eio|kill CALL PATH [#N]"), so that a new one fails and a fixed one too.
+// Calls are named in their *at form, which every architecture has.
 #include <gtest/gtest.h>
 #include <signal.h>
 
@@ -20,10 +21,20 @@ namespace vell::testing {
 namespace {
 
 struct fault_point {
-  std::string call;
+  std::string call;   // as this architecture makes it, to inject
   int occurrence;     // of this call since the process began
-  std::string label;  // "unlink /var/db/timezone/icutz", " #2" on repeats
+  std::string label;  // "unlinkat /var/db/timezone/icutz", " #2" on repeats
 };
+
+// x86-64 and 32-bit ARM have the old path calls beside the *at ones; arm64
+// has only the *at ones (and rmdir is unlinkat there), so labels use those.
+std::string at_form(const std::string& call) {
+  static const std::map<std::string, std::string> at = {
+      {"unlink", "unlinkat"}, {"rmdir", "unlinkat"},   {"symlink", "symlinkat"},
+      {"mkdir", "mkdirat"},   {"rename", "renameat"}, {"readlink", "readlinkat"}};
+  const auto found = at.find(call);
+  return found == at.end() ? call : found->second;
+}
 
 // Every file-system call of an unfaulted start on the device's paths, or on
 // descriptors opened there; the loader's and a sanitizer's calls are not vell's.
@@ -48,7 +59,7 @@ std::vector<fault_point> fault_points(const scenario& s) {
     if (!m[4].matched && !descriptors.contains(descriptor)) continue;
     if (m[1] == "openat") descriptors.insert(m[5]);
     if (m[1] == "close") descriptors.erase(descriptor);
-    std::string label = m.str(1) + (m[4].matched ? " " + path : "");
+    std::string label = at_form(m[1]) + (m[4].matched ? " " + path : "");
     if (const int seen = ++labels[label]; seen > 1) label += " #" + std::to_string(seen);
     points.push_back({m[1], occurrence, label});
   }
