@@ -29,9 +29,10 @@ struct fault_point {
 // x86-64 and 32-bit ARM have the old path calls beside the *at ones; arm64
 // has only the *at ones (and rmdir is unlinkat there), so labels use those.
 std::string at_form(const std::string& call) {
-  static const std::map<std::string, std::string> at = {
-      {"unlink", "unlinkat"}, {"rmdir", "unlinkat"},   {"symlink", "symlinkat"},
-      {"mkdir", "mkdirat"},   {"rename", "renameat"}, {"readlink", "readlinkat"}};
+  static const std::map<std::string, std::string> at = {{"unlink", "unlinkat"},
+                                                        {"rmdir", "unlinkat"},
+                                                        {"symlink", "symlinkat"},
+                                                        {"readlink", "readlinkat"}};
   const auto found = at.find(call);
   return found == at.end() ? call : found->second;
 }
