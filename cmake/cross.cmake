@@ -1,8 +1,8 @@
 # What the ARM toolchain files share: clang for VELL_TRIPLE, and libc++ for
 # that architecture unpacked from Debian's packages into the build folder
 # (Debian cannot install it beside the host's; the headers are the host's,
-# the same for every architecture). Everything links statically,
-# so the test binary, like vell, runs under qemu-user without a loader.
+# the same for every architecture). Everything links statically, so the test
+# binary, like vell, runs under qemu-user without a loader.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_C_COMPILER clang)
 set(CMAKE_CXX_COMPILER clang++)
