@@ -17,9 +17,6 @@ bool is_regular(int fd, bool sole_name) {
   return fstat(fd, &status) == 0 && S_ISREG(status.st_mode) && (!sole_name || status.st_nlink == 1);
 }
 
-// Closes `fd`; true when `done` and the close succeeded.
-bool close_after(int fd, bool done) { return close(fd) == 0 && done; }
-
 }  // namespace
 
 std::string read_first_word(const std::string& path) {
@@ -39,7 +36,9 @@ std::string read_first_word(const std::string& path) {
 
 bool touch_own_file(const std::string& path, int protection_class) {
   const int fd = platform::open_protected(path.c_str(), own_file_flags, protection_class, 0666);
-  return fd >= 0 && close_after(fd, is_regular(fd, true));
+  if (fd < 0) return false;
+  const bool ours = is_regular(fd, true);
+  return close(fd) == 0 && ours;
 }
 
 void replace_own_file(const std::string& path, const std::string& contents) {
