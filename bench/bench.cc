@@ -23,13 +23,13 @@
 #include <string>
 #include <vector>
 
-#include "testing/sandbox.h"
+#include "tools/notation.h"
+#include "tools/sandbox.h"
 
 extern char** environ;
 
 namespace {
 
-using vell::testing::sandbox;
 
 struct program {
   const char* name;
@@ -50,7 +50,7 @@ const char* const changed_by_a_start[] = {"/var/db/timezone/zoneinfo",
 
 void prepare(const start& s) {
   for (const char* path : changed_by_a_start) unlink(path);
-  for (const std::string& entry : s.links) vell::testing::lay_out(entry);
+  for (const std::string& entry : s.links) vell::sandbox::lay_out(entry);
 }
 
 // Runs `argv` with its output discarded; returns wall nanoseconds.
@@ -199,8 +199,9 @@ int main(int argc, char** argv) {
   close(mkstemp(scratch_name));
   const std::string scratch = scratch_name;
 
-  sandbox box;
-  vell::testing::lay_out_device();
+  vell::sandbox::enter_private_namespace();
+  vell::sandbox::vell_device device("", vell::sandbox::sample_device("", ""));
+  device.reset();
   std::printf("%d interleaved runs per program and start; floors are those of the steady start.\n",
               runs);
   for (const start& s : starts) {
