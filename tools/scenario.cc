@@ -72,7 +72,7 @@ void run_then(const std::string& command) {
   }
 }
 
-std::string quoted(const std::string& text) { return "\"" + text + "\""; }
+std::string in_quotes(const std::string& text) { return "\"" + text + "\""; }
 
 }  // namespace
 
@@ -165,13 +165,13 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
       for (size_t m = 0; m < checked; ++m) {
         const std::string got = m < result.messages.size() ? as_written(result.messages[m]) : "";
         if (first + m == end) {
-          fail(step, "unexpected message " + quoted(got));
+          fail(step, "unexpected message " + in_quotes(got));
           break;
         }
         const std::string want = s.steps[first + m].text.substr(std::min<size_t>(2, s.steps[first + m].text.size()));
         if (m >= result.messages.size() || got != want) {
-          fail(s.steps[first + m], "expected message " + quoted(want) + ", found " +
-                                       (m < result.messages.size() ? quoted(got) : "none"));
+          fail(s.steps[first + m], "expected message " + in_quotes(want) + ", found " +
+                                       (m < result.messages.size() ? in_quotes(got) : "none"));
           break;
         }
       }
@@ -194,14 +194,14 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
       if (path.size() > 1 && path.ends_with('/')) path.pop_back();
       std::string got = describe(path, words.size() > 1 && words[1].starts_with("["));
       got = got.substr(0, got.find_last_not_of(' ') + 1);
-      if (got != step.text) fail(step, "expected " + quoted(step.text) + ", found " + quoted(got));
+      if (got != step.text) fail(step, "expected " + in_quotes(step.text) + ", found " + in_quotes(got));
     }
   }
   if (!options.then.empty()) run_then(options.then);
   const std::string why = gate(options.vell, last_status);
   if (verdict != nullptr && why != verdict->text.substr(8))
-    fail(*verdict, "expected verdict " + quoted(verdict->text.substr(8)) + ", found " +
-                       (why.empty() ? "pass" : quoted(why)));
+    fail(*verdict, "expected verdict " + in_quotes(verdict->text.substr(8)) + ", found " +
+                       (why.empty() ? "pass" : in_quotes(why)));
   if (verdict == nullptr && !why.empty()) failures.push_back(s.where + ": " + why);
   return failures;
 }
