@@ -37,6 +37,9 @@ void vell_icu::find_schema_in_directory() {
   }
   // The walk's end and its failure are alike: whatever was found so far counts.
   for (FTSENT* entry; schema_.empty() && (entry = fts_read(walk.get())) != nullptr;) {
+    // Nothing below the first level can count: the walk need not go there,
+    // however large a tree the folder or a link in it leads to.
+    if (entry->fts_level == 1 && entry->fts_info == FTS_D) fts_set(walk.get(), entry, FTS_SKIP);
     if (entry->fts_errno != 0 || entry->fts_level != 1 || entry->fts_info != FTS_F ||
         (entry->fts_statp->st_mode & S_IROTH) == 0)
       continue;

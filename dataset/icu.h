@@ -16,7 +16,8 @@ class vell_icu final : public vell_dataset_component {
   /// of "icutzformat.txt" (read_first_word: silently "" when missing or not
   /// a regular file); a downloaded one's comes
   /// from the first file directly inside the directory named
-  /// "icutz([0-9]+[lbe])\.dat", regular and readable by others, else
+  /// "icutz([0-9]+[lbe])\.dat", regular and readable by others (the walk
+  /// lists that directory only, never one below it), else
   /// "No ICU schema found for %s" and "". When the walk cannot start, prints
   /// "tz_icu::initialize: fts_open of %s failed, %s" and throws errno as int.
   explicit vell_icu(const std::string& dataset_path);

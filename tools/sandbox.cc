@@ -138,7 +138,8 @@ void vell_device::reset() {
   for (const std::string& entry : entries_) lay_out(entry);
 }
 
-start_result run_start(const std::string& vell, const std::vector<std::string>& wrapper) {
+start_result run_start(const std::string& vell, const std::vector<std::string>& wrapper,
+                       int limit_seconds) {
   std::vector<const char*> argv;
   for (const std::string& word : wrapper) argv.push_back(word.c_str());
   argv.push_back(vell.c_str());
@@ -160,7 +161,7 @@ start_result run_start(const std::string& vell, const std::vector<std::string>& 
   struct sigaction on_alarm {};
   on_alarm.sa_handler = [](int) {};
   sigaction(SIGALRM, &on_alarm, nullptr);
-  alarm(start_time_limit_seconds);
+  alarm(limit_seconds);
   int wait_status = 0;
   while (waitpid(child, &wait_status, 0) < 0) {
     if (errno != EINTR) break;

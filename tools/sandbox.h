@@ -50,7 +50,7 @@ class vell_device {
 /// may write are the caller's user's and group's.
 void check_image(const std::string& image);
 
-/// How long one start may run before it is killed.
+/// How long one start may run before it is killed, unless a scenario says.
 inline constexpr int start_time_limit_seconds = 5;
 
 struct start_result {
@@ -60,9 +60,10 @@ struct start_result {
 
 /// Runs `vell` with no arguments, an empty environment and standard input
 /// from /dev/null, behind `wrapper` (such as strace and its arguments) when
-/// given. A start still running after start_time_limit_seconds is killed
-/// with all it started.
-start_result run_start(const std::string& vell, const std::vector<std::string>& wrapper = {});
+/// given. A start still running after `limit_seconds` is killed with all it
+/// started.
+start_result run_start(const std::string& vell, const std::vector<std::string>& wrapper = {},
+                       int limit_seconds = start_time_limit_seconds);
 
 }  // namespace vell::sandbox
 

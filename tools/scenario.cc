@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <sstream>
@@ -95,7 +96,7 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
       if (words.size() != 1 && words.size() != 3) throw unreadable("device takes no or two datasets");
       all.push_back({where, title, "", sample_device(words.size() == 3 ? words[1] : "",
                                                      words.size() == 3 ? words[2] : ""),
-                     {}, false, {}});
+                     {}, start_time_limit_seconds, false, {}});
       continue;
     }
     if (all.empty()) throw unreadable("a scenario begins with a device line");
@@ -104,6 +105,9 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
     const std::string last = started ? s.steps.back().text : "";
     if (text == "faults") {
       s.faults = true;
+    } else if (words[0] == "limit" && !started) {
+      s.limit_seconds = words.size() == 2 ? std::atoi(words[1].c_str()) : 0;
+      if (s.limit_seconds < 1 || s.limit_seconds > 60) throw unreadable("limit takes 1 to 60 seconds");
     } else if (words[0] == "known") {
       if (words.size() < 3 || (words[1] != "eio" && words[1] != "kill"))
         throw unreadable("known takes eio or kill, a call and a path");
@@ -131,7 +135,7 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
 }
 
 vell_scenario image_scenario(const std::string& image, int starts) {
-  vell_scenario s{image, "", image, {}, {}, false, {}};
+  vell_scenario s{image, "", image, {}, {}, start_time_limit_seconds, false, {}};
   s.steps.assign(starts, {image, "start"});
   return s;
 }
@@ -151,7 +155,7 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
     const std::vector<std::string> words = words_of(step.text);
     if (const int status = start_status(step.text); status != -2) {
       const std::vector<std::string> before = written_state();
-      const start_result result = run_start(options.vell);
+      const start_result result = run_start(options.vell, {}, s.limit_seconds);
       print_start(++number, result, before, written_state());
       last_status = result.status;
       if (status >= 0 && status != result.status)

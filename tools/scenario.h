@@ -10,6 +10,8 @@
 //   active DATASET           zoneinfo and icutz name DATASET ("system": the
 //                            system data, and no icutz)
 //   verdict REASON           the gate is expected to fail, for this reason
+//   limit SECONDS            before the first start: each start is killed
+//                            after SECONDS (1 to 60) instead of 5
 //   faults                   --faults sweeps this scenario's first start
 //   known eio|kill CALL PATH [#N]  a fault point expected to leave the
 //                            device unusable (faults.h)
@@ -19,6 +21,8 @@
 
 #include <string>
 #include <vector>
+
+#include "tools/sandbox.h"
 
 namespace vell::sandbox {
 
@@ -33,6 +37,7 @@ struct vell_scenario {
   std::string image;                // the image directory it runs on, or ""
   std::vector<std::string> device;  // the entries laid out before the first start
   std::vector<vell_step> steps;     // from the first start on
+  int limit_seconds = start_time_limit_seconds;  // for each of its starts
   bool faults = false;
   std::vector<vell_step> known;     // "eio|kill CALL PATH [#N]"
 };

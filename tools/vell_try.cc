@@ -59,6 +59,8 @@ comment, and the comment above a device line names its scenario:
                            the error text
   active DATASET           zoneinfo and icutz name DATASET, or "system"
   verdict REASON           the check above fails, for this reason
+  limit SECONDS            before the first start: each start is killed
+                           after SECONDS (1 to 60) instead of 5
   faults                   --faults sweeps this scenario (if none is marked,
                            every scenario of the file)
   known eio|kill CALL PATH [#N]  a fault point known to leave it failing
