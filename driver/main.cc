@@ -2,8 +2,12 @@
 #include <err.h>
 
 #include "driver/startup.h"
+#include "fs/paths.h"
+#include "platform/confinement.h"
 
 int main() {
+  // Before any file-system work: whatever a start is led to, it cannot write elsewhere.
+  vell::platform::confine_writes_beneath(vell::paths::writable_root);
   try {
     return vell::run_startup();
   } catch (...) {

@@ -18,6 +18,9 @@ inline constexpr char latest_link[] = "/var/db/timezone/tz_latest";
 inline constexpr char cleanup_marker[] = "/var/db/timezone/needs_cleanup";
 inline constexpr char version_diff_record[] = "/var/db/timezone/TZVersionDiffRecord";
 
+// The one directory below which vell writes anything; the kernel holds it to that.
+inline constexpr char writable_root[] = "/var/db";
+
 // Places of older releases.
 inline constexpr char legacy_icutz_link[] = "/var/db/icutz";
 inline constexpr char legacy_icu_dir[] = "/var/db/icu";
