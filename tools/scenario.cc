@@ -89,6 +89,7 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
     if (line.empty() || line.starts_with("#")) continue;
     const std::string text = expand(line);
     const std::vector<std::string> words = words_of(text);
+    if (words.empty()) continue;  // blanks alone
     const auto unreadable = [&](const std::string& why) {
       return vell_try_error(where + ": " + why + ": " + line);
     };

@@ -62,9 +62,11 @@ std::string unusable_links() {
   const std::string target = zoneinfo.starts_with("-> ") ? zoneinfo.substr(3) : "";
   std::string dataset;  // "" for the system data
   if (target != system_zoneinfo) {
-    const std::string name = target.starts_with(downloads) && target.ends_with("/zoneinfo")
-                                 ? target.substr(downloads.size(), target.size() - 9 - downloads.size())
-                                 : "";
+    const std::string suffix = "/zoneinfo";
+    const bool download = target.starts_with(downloads) && target.ends_with(suffix) &&
+                          target.size() > downloads.size() + suffix.size();
+    const std::string name =
+        download ? target.substr(downloads.size(), target.size() - suffix.size() - downloads.size()) : "";
     if (name.empty() || name.find('/') != std::string::npos)
       return "zoneinfo is " + zoneinfo + ", neither the system data nor a download";
     dataset = downloads + name;
