@@ -151,8 +151,8 @@ start_result run_start(const std::string& vell, const std::vector<std::string>& 
     // A group of its own, so that a wrapper and what it runs are killed together.
     setpgid(0, 0);
     dup2(messages, 2);
-    const int null = open("/dev/null", O_RDONLY);
-    dup2(null, 0);
+    // Standard input from /dev/null, and no other descriptor of vell-try's left behind.
+    dup2(open("/dev/null", O_RDONLY | O_CLOEXEC), 0);
     char* const no_environment[] = {nullptr};
     execve(argv[0], const_cast<char* const*>(argv.data()), no_environment);
     _exit(127);
