@@ -11,6 +11,7 @@
 #include <set>
 #include <sstream>
 
+#include "tools/notation.h"
 #include "tools/sandbox.h"
 #include "tools/verdict.h"
 
@@ -40,12 +41,7 @@ std::vector<fault_point> fault_points(const std::string& vell, const std::string
   const int trace = memfd_create("vell-trace", 0);
   run_start(vell, {strace, "-qq", "-o", "/proc/self/fd/" + std::to_string(trace), "-e",
                    "trace=%file,read,write,close,lseek,fstat,newfstatat,fchdir,getdents64,ftruncate"});
-  std::string text;
-  char buffer[4096];
-  lseek(trace, 0, SEEK_SET);
-  for (ssize_t n; (n = read(trace, buffer, sizeof buffer)) > 0;) text.append(buffer, n);
-  close(trace);
-  std::istringstream lines(text);
+  std::istringstream lines(read_all_and_close(trace));
   std::map<std::string, int> calls, labels;
   std::set<std::string> descriptors;
   std::vector<fault_point> points;

@@ -72,16 +72,16 @@ void write_file(const entry& e) {
   if (close(fd) != 0 || !written || chmod(e.path.c_str(), e.mode) != 0) fail(e.path);
 }
 
-std::string read_file(const std::string& path) {
+}  // namespace
+
+std::string read_all_and_close(int fd) {
   std::string text;
-  const int fd = open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
   char buffer[4096];
+  lseek(fd, 0, SEEK_SET);
   for (ssize_t n; fd >= 0 && (n = read(fd, buffer, sizeof buffer)) > 0;) text.append(buffer, n);
   if (fd >= 0) close(fd);
   return text;
 }
-
-}  // namespace
 
 std::string expand(const std::string& line) {
   std::string out;
@@ -131,7 +131,7 @@ std::string describe(const std::string& path, bool with_mode) {
   if (!S_ISREG(st.st_mode)) return path + " other";
   char mode[16] = "";
   if (with_mode) std::snprintf(mode, sizeof mode, " [%04o]", st.st_mode & 07777);
-  return path + mode + " = " + read_file(path);
+  return path + mode + " = " + read_all_and_close(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
 }
 
 std::string what_stands(const std::string& path) {

@@ -32,6 +32,9 @@ void lay_out(const std::string& entry);
 /// when `with_mode`.
 std::string describe(const std::string& path, bool with_mode = false);
 
+/// Everything the open file `fd` holds, from its start; closes `fd`.
+std::string read_all_and_close(int fd);
+
 /// What stands at `path`, as describe gives it without the path: "/",
 /// "-> TARGET", "= TEXT", "fifo", "other" or "absent".
 std::string what_stands(const std::string& path);

@@ -171,11 +171,7 @@ start_result run_start(const std::string& vell, const std::vector<std::string>& 
   alarm(0);
   start_result result{
       WIFEXITED(wait_status) ? WEXITSTATUS(wait_status) : 128 + WTERMSIG(wait_status), {}};
-  std::string text;
-  char buffer[4096];
-  lseek(messages, 0, SEEK_SET);
-  for (ssize_t n; (n = read(messages, buffer, sizeof buffer)) > 0;) text.append(buffer, n);
-  close(messages);
+  const std::string text = read_all_and_close(messages);
   for (size_t begin = 0, end; begin < text.size(); begin = end + 1) {
     end = text.find('\n', begin);
     if (end == std::string::npos) end = text.size();
