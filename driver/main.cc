@@ -4,8 +4,11 @@
 #include "driver/startup.h"
 #include "fs/paths.h"
 #include "platform/confinement.h"
+#include "platform/run_limit.h"
 
 int main() {
+  // Never holds up a boot, whatever starts it: the same bound as the unit's.
+  vell::platform::limit_run_time(30);
   // Before any file-system work: whatever a start is led to, it cannot write elsewhere.
   vell::platform::confine_writes_beneath(vell::paths::writable_root);
   try {
