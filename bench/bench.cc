@@ -30,7 +30,6 @@ extern char** environ;
 
 namespace {
 
-
 struct program {
   const char* name;
   std::string path;

@@ -18,7 +18,8 @@ namespace vell::platform {
 
 void confine_writes_beneath(const char* dir) {
   const int saved_errno = errno;
-  const long abi = syscall(SYS_landlock_create_ruleset, nullptr, 0, LANDLOCK_CREATE_RULESET_VERSION);
+  const long abi =
+      syscall(SYS_landlock_create_ruleset, nullptr, 0, LANDLOCK_CREATE_RULESET_VERSION);
   std::uint64_t writes = LANDLOCK_ACCESS_FS_WRITE_FILE | LANDLOCK_ACCESS_FS_REMOVE_DIR |
                          LANDLOCK_ACCESS_FS_REMOVE_FILE | LANDLOCK_ACCESS_FS_MAKE_CHAR |
                          LANDLOCK_ACCESS_FS_MAKE_DIR | LANDLOCK_ACCESS_FS_MAKE_REG |
@@ -32,7 +33,8 @@ void confine_writes_beneath(const char* dir) {
     const landlock_ruleset_attr ruleset{.handled_access_fs = writes};
     const int rules = syscall(SYS_landlock_create_ruleset, &ruleset, sizeof ruleset, 0);
     const landlock_path_beneath_attr rule{.allowed_access = writes, .parent_fd = beneath};
-    if (rules >= 0 && syscall(SYS_landlock_add_rule, rules, LANDLOCK_RULE_PATH_BENEATH, &rule, 0) == 0 &&
+    if (rules >= 0 &&
+        syscall(SYS_landlock_add_rule, rules, LANDLOCK_RULE_PATH_BENEATH, &rule, 0) == 0 &&
         prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0)
       syscall(SYS_landlock_restrict_self, rules, 0);
     if (rules >= 0) close(rules);

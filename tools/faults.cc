@@ -27,9 +27,10 @@ struct fault_point {
 // x86-64 and 32-bit ARM have the old path calls beside the *at ones; arm64
 // has only the *at ones (and rmdir is unlinkat there), so labels use those.
 std::string at_form(const std::string& call) {
-  static const std::map<std::string, std::string> at = {
-      {"unlink", "unlinkat"}, {"rmdir", "unlinkat"}, {"symlink", "symlinkat"},
-      {"readlink", "readlinkat"}};
+  static const std::map<std::string, std::string> at = {{"unlink", "unlinkat"},
+                                                        {"rmdir", "unlinkat"},
+                                                        {"symlink", "symlinkat"},
+                                                        {"readlink", "readlinkat"}};
   const auto found = at.find(call);
   return found == at.end() ? call : found->second;
 }
@@ -39,8 +40,9 @@ std::string at_form(const std::string& call) {
 // calls are not vell's.
 std::vector<fault_point> fault_points(const std::string& vell, const std::string& strace) {
   const int trace = memfd_create("vell-trace", 0);
-  run_start(vell, {strace, "-qq", "-o", "/proc/self/fd/" + std::to_string(trace), "-e",
-                   "trace=%file,read,write,close,lseek,fstat,newfstatat,fchdir,getdents64,ftruncate"});
+  run_start(vell,
+            {strace, "-qq", "-o", "/proc/self/fd/" + std::to_string(trace), "-e",
+             "trace=%file,read,write,close,lseek,fstat,newfstatat,fchdir,getdents64,ftruncate"});
   std::istringstream lines(read_all_and_close(trace));
   std::map<std::string, int> calls, labels;
   std::set<std::string> descriptors;
@@ -68,10 +70,9 @@ std::vector<fault_point> fault_points(const std::string& vell, const std::string
 std::string check(const fault_point& point, const std::string& fault, const std::string& vell,
                   const std::string& strace) {
   const std::string data = data_fingerprint();
-  const start_result faulted =
-      run_start(vell, {strace, "-qq", "-o", "/dev/null", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
-                       "inject=" + point.call + ":" + fault + ":when=" +
-                           std::to_string(point.occurrence)});
+  const start_result faulted = run_start(
+      vell, {strace, "-qq", "-o", "/dev/null", "-E", "ASAN_OPTIONS=detect_leaks=0", "-e",
+             "inject=" + point.call + ":" + fault + ":when=" + std::to_string(point.occurrence)});
   if (faulted.status > 1 && faulted.status != 128 + SIGKILL)
     return "the faulted start ended with status " + std::to_string(faulted.status);
   if (const int status = run_start(vell).status; status != 0)
@@ -89,7 +90,8 @@ std::string find_strace() {
   for (std::string dir; std::getline(dirs, dir, ':');) {
     if (!dir.empty() && access((dir + "/strace").c_str(), X_OK) == 0) return dir + "/strace";
   }
-  throw vell_try_error("--faults needs strace, which is not on PATH (Debian: apt-get install strace)");
+  throw vell_try_error(
+      "--faults needs strace, which is not on PATH (Debian: apt-get install strace)");
 }
 
 std::vector<std::string> sweep(const vell_scenario& s, const std::string& vell,
@@ -112,7 +114,8 @@ std::vector<std::string> sweep(const vell_scenario& s, const std::string& vell,
     }
   }
   for (const vell_step& step : s.known) {
-    if (!failing.contains(step.text)) failures.push_back(step.where + ": known, now holds: " + step.text);
+    if (!failing.contains(step.text))
+      failures.push_back(step.where + ": known, now holds: " + step.text);
   }
   std::printf("=== %s: %zu fault points, %zu leave the device unusable (%zu known)\n",
               s.where.c_str(), points.size(), failing.size(), s.known.size());

@@ -16,7 +16,7 @@ namespace {
 struct entry {
   std::string path;
   std::string_view kind;  // "/", "->", "=>", "=", "fifo", "absent"
-  std::string text;  // the target, the other file or the contents
+  std::string text;       // the target, the other file or the contents
   mode_t mode;
 };
 
@@ -131,7 +131,8 @@ std::string describe(const std::string& path, bool with_mode) {
   if (!S_ISREG(st.st_mode)) return path + " other";
   char mode[16] = "";
   if (with_mode) std::snprintf(mode, sizeof mode, " [%04o]", st.st_mode & 07777);
-  return path + mode + " = " + read_all_and_close(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  return path + mode + " = " +
+         read_all_and_close(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
 }
 
 std::string what_stands(const std::string& path) {
@@ -152,7 +153,8 @@ std::vector<std::string> sample_device(const std::string& current, const std::st
   for (const char* version : {"2016a.1.0", "2016b.1.0", "2016d.1.0", "2016e.1.0", "2017a.1.0"}) {
     const std::string dataset = "/var/db/timezone/tz/" + std::string(version);
     entries.push_back(dataset + "/zoneinfo/America/Los_Angeles = TZif");
-    entries.push_back(dataset + "/icutz/icutz" + (version[3] == '7' ? "44b" : "44l") + ".dat = ICU");
+    entries.push_back(dataset + "/icutz/icutz" + (version[3] == '7' ? "44b" : "44l") +
+                      ".dat = ICU");
   }
   const auto dataset = [](const std::string& name) { return "/var/db/timezone/tz/" + name; };
   if (current == "system") {

@@ -20,9 +20,10 @@ namespace {
 
 const char* const covered[] = {"/var", "/usr/share"};
 // The upper layers of an image's overlays, in the memory mounted at /var beneath them.
-const char* const stage_dirs[] = {"/var/.vell-try", "/var/.vell-try/var", "/var/.vell-try/share",
-                                  "/var/.vell-try/var/upper", "/var/.vell-try/var/work",
-                                  "/var/.vell-try/share/upper", "/var/.vell-try/share/work"};
+const char* const stage_dirs[] = {"/var/.vell-try",           "/var/.vell-try/var",
+                                  "/var/.vell-try/share",     "/var/.vell-try/var/upper",
+                                  "/var/.vell-try/var/work",  "/var/.vell-try/share/upper",
+                                  "/var/.vell-try/share/work"};
 
 bool in_user_namespace = false;
 
@@ -35,8 +36,8 @@ void write_proc(const char* path, const std::string& text) {
   if (!written) throw vell_try_error(with_errno(std::string("cannot write ") + path));
 }
 
-void mount_or_throw(const char* source, const char* target, const char* type,
-                    unsigned long flags, const std::string& options) {
+void mount_or_throw(const char* source, const char* target, const char* type, unsigned long flags,
+                    const std::string& options) {
   if (mount(source, target, type, flags, options.c_str()) != 0)
     throw std::runtime_error(with_errno(std::string("cannot mount ") + type + " on " + target));
 }

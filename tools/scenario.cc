@@ -29,7 +29,8 @@ std::vector<std::string> words_of(const std::string& text) {
 int start_status(const std::string& text) {
   if (text == "start") return -1;
   const std::string status = text.starts_with("start ") ? text.substr(6) : "";
-  if (status.empty() || status.size() > 3 || status.find_first_not_of("0123456789") != std::string::npos)
+  if (status.empty() || status.size() > 3 ||
+      status.find_first_not_of("0123456789") != std::string::npos)
     return -2;
   return std::stoi(status);
 }
@@ -54,7 +55,8 @@ void print_start(int number, const start_result& result, const std::vector<std::
   std::printf("  %-22s %-46s %s\n", "entry", "before", "after");
   for (size_t i = 0; i < written_paths.size(); ++i) {
     const std::string name = written_paths[i].starts_with("/var/db/timezone/")
-                                 ? written_paths[i].substr(17) : written_paths[i];
+                                 ? written_paths[i].substr(17)
+                                 : written_paths[i];
     std::printf("%c %-22s %-46s %s\n", before[i] == after[i] ? ' ' : '*', name.c_str(),
                 cell(before[i]).c_str(), before[i] == after[i] ? "(same)" : cell(after[i]).c_str());
   }
@@ -94,10 +96,17 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
       return vell_try_error(where + ": " + why + ": " + line);
     };
     if (words[0] == "device") {
-      if (words.size() != 1 && words.size() != 3) throw unreadable("device takes no or two datasets");
-      all.push_back({where, title, "", sample_device(words.size() == 3 ? words[1] : "",
-                                                     words.size() == 3 ? words[2] : ""),
-                     {}, start_time_limit_seconds, false, {}});
+      if (words.size() != 1 && words.size() != 3)
+        throw unreadable("device takes no or two datasets");
+      all.push_back(
+          {where,
+           title,
+           "",
+           sample_device(words.size() == 3 ? words[1] : "", words.size() == 3 ? words[2] : ""),
+           {},
+           start_time_limit_seconds,
+           false,
+           {}});
       continue;
     }
     if (all.empty()) throw unreadable("a scenario begins with a device line");
@@ -108,7 +117,8 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
       s.faults = true;
     } else if (words[0] == "limit" && !started) {
       s.limit_seconds = words.size() == 2 ? std::atoi(words[1].c_str()) : 0;
-      if (s.limit_seconds < 1 || s.limit_seconds > 60) throw unreadable("limit takes 1 to 60 seconds");
+      if (s.limit_seconds < 1 || s.limit_seconds > 60)
+        throw unreadable("limit takes 1 to 60 seconds");
     } else if (words[0] == "known") {
       if (words.size() < 3 || (words[1] != "eio" && words[1] != "kill"))
         throw unreadable("known takes eio or kill, a call and a path");
@@ -118,12 +128,14 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
     } else if (!started && is_entry(text)) {
       s.device.push_back(text);
     } else if (!started) {
-      const bool expectation = words[0] == "active" || words[0] == "verdict" || text.starts_with("|");
+      const bool expectation =
+          words[0] == "active" || words[0] == "verdict" || text.starts_with("|");
       throw unreadable(expectation ? "expectations come after a start" : "cannot read");
     } else if (text.starts_with("|") && !last.starts_with("|") && start_status(last) == -2) {
       throw unreadable("messages follow a start");
-    } else if (text.starts_with("| ") || text == "|" || (words[0] == "active" && words.size() == 2) ||
-               words[0] == "verdict" || is_entry(text)) {
+    } else if (text.starts_with("| ") || text == "|" ||
+               (words[0] == "active" && words.size() == 2) || words[0] == "verdict" ||
+               is_entry(text)) {
       s.steps.push_back({where, text});
     } else {
       throw unreadable("cannot read");
@@ -173,7 +185,8 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
           fail(step, "unexpected message " + in_quotes(got));
           break;
         }
-        const std::string want = s.steps[first + m].text.substr(std::min<size_t>(2, s.steps[first + m].text.size()));
+        const std::string want =
+            s.steps[first + m].text.substr(std::min<size_t>(2, s.steps[first + m].text.size()));
         if (m >= result.messages.size() || got != want) {
           fail(s.steps[first + m], "expected message " + in_quotes(want) + ", found " +
                                        (m < result.messages.size() ? in_quotes(got) : "none"));
@@ -199,7 +212,8 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
       if (path.size() > 1 && path.ends_with('/')) path.pop_back();
       std::string got = describe(path, words.size() > 1 && words[1].starts_with("["));
       got = got.substr(0, got.find_last_not_of(' ') + 1);
-      if (got != step.text) fail(step, "expected " + in_quotes(step.text) + ", found " + in_quotes(got));
+      if (got != step.text)
+        fail(step, "expected " + in_quotes(step.text) + ", found " + in_quotes(got));
     }
   }
   if (!options.then.empty()) run_then(options.then);

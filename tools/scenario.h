@@ -32,14 +32,14 @@ struct vell_step {
 };
 
 struct vell_scenario {
-  std::string where;                // "FILE:LINE" of its device line, or the image
-  std::string title;                // the comment naming it
-  std::string image;                // the image directory it runs on, or ""
-  std::vector<std::string> device;  // the entries laid out before the first start
-  std::vector<vell_step> steps;     // from the first start on
+  std::string where;                             // "FILE:LINE" of its device line, or the image
+  std::string title;                             // the comment naming it
+  std::string image;                             // the image directory it runs on, or ""
+  std::vector<std::string> device;               // the entries laid out before the first start
+  std::vector<vell_step> steps;                  // from the first start on
   int limit_seconds = start_time_limit_seconds;  // for each of its starts
   bool faults = false;
-  std::vector<vell_step> known;     // "eio|kill CALL PATH [#N]"
+  std::vector<vell_step> known;  // "eio|kill CALL PATH [#N]"
 };
 
 /// The scenarios of a file. One without a start gets `starts` plain starts.

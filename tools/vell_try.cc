@@ -105,8 +105,9 @@ int run(int argc, char** argv) {
     } else if (arg == "--faults") {
       faults = true;
     } else if (arg.starts_with("-") || !image.empty()) {
-      throw vell_try_error("usage: vell-try [--starts N] [--vell PATH] [--then COMMAND] "
-                           "[--faults] IMAGE (--help tells more)");
+      throw vell_try_error(
+          "usage: vell-try [--starts N] [--vell PATH] [--then COMMAND] "
+          "[--faults] IMAGE (--help tells more)");
     } else {
       image = arg;
     }
@@ -145,8 +146,8 @@ int run(int argc, char** argv) {
   for (const std::string& failure : failures) std::printf("vell-try: fail: %s\n", failure.c_str());
   if (failures.empty())
     std::printf("vell-try: pass: %s\n",
-                faults ? "after every fault point two clean starts left usable links that one "
-                         "more start did not change, and no download or system data changed"
+                faults     ? "after every fault point two clean starts left usable links that one "
+                             "more start did not change, and no download or system data changed"
                 : is_image ? "the last start ended with 0, the links lead to usable data, and one "
                              "more start changed nothing"
                            : "every scenario ended as its expectations and verdicts say");

@@ -46,10 +46,14 @@ bool has_icu_data_for(const std::string& icutz, const std::string& schema) {
 
 }  // namespace
 
-const std::vector<std::string> written_paths = {
-    data_dir + "zoneinfo",      data_dir + "icutz",         data_dir + "tz_latest",
-    data_dir + "localtime",     data_dir + "needs_cleanup", data_dir + "TZVersionDiffRecord",
-    "/var/db/icutz",            "/var/db/icu"};
+const std::vector<std::string> written_paths = {data_dir + "zoneinfo",
+                                                data_dir + "icutz",
+                                                data_dir + "tz_latest",
+                                                data_dir + "localtime",
+                                                data_dir + "needs_cleanup",
+                                                data_dir + "TZVersionDiffRecord",
+                                                "/var/db/icutz",
+                                                "/var/db/icu"};
 
 std::vector<std::string> written_state() {
   std::vector<std::string> state;
@@ -66,18 +70,20 @@ std::string unusable_links() {
     const bool download = target.starts_with(downloads) && target.ends_with(suffix) &&
                           target.size() > downloads.size() + suffix.size();
     const std::string name =
-        download ? target.substr(downloads.size(), target.size() - suffix.size() - downloads.size()) : "";
+        download ? target.substr(downloads.size(), target.size() - suffix.size() - downloads.size())
+                 : "";
     if (name.empty() || name.find('/') != std::string::npos)
       return "zoneinfo is " + zoneinfo + ", neither the system data nor a download";
     dataset = downloads + name;
     const std::string schema = first_word("/usr/share/icu/icutzformat.txt");
     if (schema.empty() || !has_icu_data_for(dataset + "/icutz", schema))
-      return "zoneinfo names " + dataset + ", which has no ICU data file for the system's schema \"" +
-             schema + "\"";
+      return "zoneinfo names " + dataset +
+             ", which has no ICU data file for the system's schema \"" + schema + "\"";
   }
   const std::string icutz = what_stands(data_dir + "icutz");
   if (icutz != (dataset.empty() ? "absent" : "-> " + dataset + "/icutz"))
-    return "icutz is " + icutz + " while zoneinfo names " + (dataset.empty() ? "the system data" : dataset);
+    return "icutz is " + icutz + " while zoneinfo names " +
+           (dataset.empty() ? "the system data" : dataset);
   const std::string localtime = what_stands(data_dir + "localtime");
   struct stat st;
   if (!localtime.starts_with("-> " + data_dir + "zoneinfo/") ||
@@ -108,8 +114,7 @@ std::string data_fingerprint() {
 }
 
 std::string gate(const std::string& vell, int last_status) {
-  if (last_status != 0)
-    return "the last start ended with status " + std::to_string(last_status);
+  if (last_status != 0) return "the last start ended with status " + std::to_string(last_status);
   if (std::string why = unusable_links(); !why.empty())
     return "the links do not lead to usable data: " + why;
   const std::vector<std::string> before = written_state();
