@@ -1,0 +1,25 @@
+// vell's own system-call filter (seccomp), so that under every init a fault
+// in vell, or what the updater's folder leads it to, cannot reach what vell
+// has no use for.
+#ifndef VELL_PLATFORM_SYSCALL_FILTER_H_
+#define VELL_PLATFORM_SYSCALL_FILTER_H_
+
+namespace vell::platform {
+
+/// From now on these system calls fail with EPERM in this process: loading
+/// modules, mounting, rebooting and kexec, swap, setting clocks, raw I/O,
+/// privileged calls (changing users, groups, owners, capabilities, host
+/// names, accounting, quotas), debugging (ptrace, but for builds with a leak
+/// sanitizer, whose check at exit needs it) and performance events, obsolete
+/// calls, resource limits and scheduling, CPU emulation, creating sockets,
+/// new namespaces, keyrings and bpf; and every system call of a foreign
+/// architecture (x32 and i386 on x86-64). A deny-list, so that no library or
+/// error path meets a refusal it did not expect. Sets no-new-privileges,
+/// which the kernel asks for first. Where the kernel has no seccomp, or on an
+/// architecture vell does not know, nothing changes. Never prints, never
+/// throws, and leaves errno as it found it.
+void deny_unneeded_system_calls();
+
+}  // namespace vell::platform
+
+#endif  // VELL_PLATFORM_SYSCALL_FILTER_H_

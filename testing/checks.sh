@@ -1,0 +1,40 @@
+# Sourced by the testing/check-* scripts: checks one at a time, quiet when
+# they hold, and the closing "N passed, N failed" line.
+passed=0 failed=0
+check() {  # check NAME COMMAND...: one check; on failure, the last of what it printed
+  local name=$1 output
+  shift
+  if output=$("$@" 2>&1); then passed=$((passed + 1)); else
+    failed=$((failed + 1)); echo "FAILED: $name"; echo "$output" | tail -20 | sed 's/^/  /'; fi
+}
+summary() { echo "$passed passed, $failed failed"; [ "$failed" -eq 0 ]; }
+
+# The confinement vell ended boot N with, in BOOTS ("boot N observed NAME
+# VALUE" lines, dev/observe-vell): CAP_DAC_OVERRIDE alone, no new
+# privileges, and a system-call filter.
+confined() {  # confined BOOTS N
+  local pattern
+  for pattern in "CapEff 0000000000000002" "CapPrm 0000000000000002" "CapBnd 0000000000000002" \
+    "CapInh 00000000000000[02]" "CapAmb 00000000000000[02]" "NoNewPrivs 1" "Seccomp 2"; do
+    grep -qx "boot $2 observed $pattern" <<<"$1" || { echo "not observed: $pattern"; grep "^boot $2 observed" <<<"$1"; return 1; }
+  done
+}
+
+# What two boots and a confinement boot of an init other than systemd
+# (dev/boot-init) must show on the sample device whose update is UPDATE.
+init_boot_checks() {  # init_boot_checks LABEL BOOTS UPDATE
+  local label=$1 boots=$2 update=$3
+  v() { sed -n "s/^boot $1 $2 //p" <<<"$boots" | head -1; }
+  check "$label: vell ran after the local mounts and before the first reader" \
+    test "$(v 1 'reader localtime')" = /var/db/timezone/zoneinfo/Europe/Paris
+  check "$label: the update promoted" test "$(v 1 'link zoneinfo')" = "/var/db/timezone/tz/$update/zoneinfo"
+  check "$label: vell's messages on the console" grep -q "^boot 1 message Correcting localtime link" <<<"$boots"
+  check "$label: status 0" test -z "$(grep '^boot [12] message Cannot repair' <<<"$boots")"
+  check "$label: the second boot changed nothing" test "$(grep '^boot 1 link' <<<"$boots")" = \
+    "$(grep '^boot 2 link' <<<"$boots" | sed 's/^boot 2/boot 1/')"
+  check "$label: vell's writes outside /var/db refused by its own confinement" \
+    grep -q '^boot 3 message create_symlink: .*: Permission denied$' <<<"$boots"
+  check "$label: vell confined itself: CAP_DAC_OVERRIDE alone, no new privileges, a filter" confined "$boots" 1
+  check "$label: ...its own, one more than the init and its container give" \
+    test "$(v 1 'observed Seccomp_filters')" = "$(($(v 1 filters) + 1))"
+}
