@@ -15,7 +15,7 @@ summary() { echo "$passed passed, $failed failed"; [ "$failed" -eq 0 ]; }
 confined() {  # confined BOOTS N
   local pattern
   for pattern in "CapEff 0000000000000002" "CapPrm 0000000000000002" "CapBnd 0000000000000002" \
-    "CapInh 00000000000000[02]" "CapAmb 00000000000000[02]" "NoNewPrivs 1" "Seccomp 2"; do
+    "CapInh 000000000000000[02]" "CapAmb 000000000000000[02]" "NoNewPrivs 1" "Seccomp 2"; do
     grep -qx "boot $2 observed $pattern" <<<"$1" || { echo "not observed: $pattern"; grep "^boot $2 observed" <<<"$1"; return 1; }
   done
 }
