@@ -77,7 +77,7 @@ std::string check(const fault_point& point, const std::string& fault, const std:
     return "the faulted start ended with status " + std::to_string(faulted.status);
   if (const int status = run_start(vell).status; status != 0)
     return "the first clean start ended with status " + std::to_string(status);
-  std::string why = gate(vell, run_start(vell).status);
+  std::string why = gate(vell, run_start(vell));
   if (why.empty() && data != data_fingerprint()) why = "downloaded or system data changed";
   return why;
 }
@@ -94,32 +94,38 @@ std::string find_strace() {
       "--faults needs strace, which is not on PATH (Debian: apt-get install strace)");
 }
 
-std::vector<std::string> sweep(const vell_scenario& s, const std::string& vell,
-                               const std::string& strace) {
-  vell_device device(s.image, s.device);
+std::vector<vell_check> sweep(const vell_scenario& s, const std::string& vell,
+                              const std::string& strace) {
+  vell_device device(s.image, s.device, s.device_where);
   device.reset();
   const std::vector<fault_point> points = fault_points(vell, strace);
-  std::vector<std::string> failures;
-  if (points.empty()) failures.push_back(s.where + ": strace saw no file-system call of vell");
+  const std::string suite = s.where + (s.title.empty() ? "" : " " + s.title) + " (faults)";
+  std::vector<vell_check> checks;
+  if (points.empty())
+    checks.push_back(
+        {suite, "fault points", {s.where + ": strace saw no file-system call of vell"}});
   std::set<std::string> failing;
   for (const fault_point& point : points) {
     for (const char* fault : {"error=EIO", "signal=KILL"}) {
       const std::string key = (fault[0] == 'e' ? "eio " : "kill ") + point.label;
       device.reset();
       const std::string problem = check(point, fault, vell, strace);
+      vell_check& made = checks.emplace_back(vell_check{suite, key, {}});
       if (problem.empty() || !failing.insert(key).second) continue;
       bool known = false;
       for (const vell_step& step : s.known) known = known || step.text == key;
-      if (!known) failures.push_back(s.where + ": " + key + ": " + problem);
+      if (!known) made.failures.push_back(s.where + ": " + key + ": " + problem);
     }
   }
   for (const vell_step& step : s.known) {
+    vell_check& made =
+        checks.emplace_back(vell_check{suite, step.where + ": known " + step.text, {}});
     if (!failing.contains(step.text))
-      failures.push_back(step.where + ": known, now holds: " + step.text);
+      made.failures.push_back(step.where + ": known, now holds: " + step.text);
   }
   std::printf("=== %s: %zu fault points, %zu leave the device unusable (%zu known)\n",
               s.where.c_str(), points.size(), failing.size(), s.known.size());
-  return failures;
+  return checks;
 }
 
 }  // namespace vell::sandbox

@@ -20,11 +20,12 @@ namespace vell::sandbox {
 std::string find_strace();
 
 /// Sweeps the first start of `scenario` with `vell`, under `strace`, and
-/// prints how many points there were. Returns what did not hold, a line each:
-/// each point after which the device was not as above and that the scenario
-/// does not list as known, and each known point that now holds.
-std::vector<std::string> sweep(const vell_scenario& scenario, const std::string& vell,
-                               const std::string& strace);
+/// prints how many points there were. Returns a check for each point and
+/// fault, failing when the device was not as above after it and the scenario
+/// does not list it as known, and one for each known point, failing when it
+/// now holds.
+std::vector<vell_check> sweep(const vell_scenario& scenario, const std::string& vell,
+                              const std::string& strace);
 
 }  // namespace vell::sandbox
 

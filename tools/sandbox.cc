@@ -92,8 +92,9 @@ void check_image(const std::string& image) {
   }
 }
 
-vell_device::vell_device(const std::string& image, std::vector<std::string> entries)
-    : entries_(std::move(entries)) {
+vell_device::vell_device(const std::string& image, std::vector<std::string> entries,
+                         std::vector<std::string> wheres)
+    : entries_(std::move(entries)), wheres_(std::move(wheres)) {
   if (image.empty()) return;
   image_fd_ = open(image.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (image_fd_ < 0) throw vell_try_error(with_errno(image));
@@ -136,7 +137,19 @@ void vell_device::reset() {
     }
     if (chdir("/") != 0) throw std::runtime_error(with_errno("cannot leave the image"));
   }
-  for (const std::string& entry : entries_) lay_out(entry);
+  for (size_t i = 0; i < entries_.size(); ++i) {
+    try {
+      lay_out(entries_[i]);
+    } catch (const std::exception& e) {
+      throw vell_try_error((i < wheres_.size() ? wheres_[i] + ": " : "") + "cannot lay out " +
+                           entries_[i] + ": " + e.what());
+    }
+  }
+}
+
+std::string ending(const start_result& result) {
+  return result.killed_after ? "killed after " + std::to_string(result.killed_after) + " s"
+                             : "exit status " + std::to_string(result.status);
 }
 
 start_result run_start(const std::string& vell, const std::vector<std::string>& wrapper,
@@ -163,15 +176,18 @@ start_result run_start(const std::string& vell, const std::vector<std::string>& 
   on_alarm.sa_handler = [](int) {};
   sigaction(SIGALRM, &on_alarm, nullptr);
   alarm(limit_seconds);
-  int wait_status = 0;
+  int wait_status = 0, killed_after = 0;
   while (waitpid(child, &wait_status, 0) < 0) {
     if (errno != EINTR) break;
     kill(-child, SIGKILL);
     kill(child, SIGKILL);
+    killed_after = limit_seconds;
   }
   alarm(0);
   start_result result{
-      WIFEXITED(wait_status) ? WEXITSTATUS(wait_status) : 128 + WTERMSIG(wait_status), {}};
+      WIFEXITED(wait_status) ? WEXITSTATUS(wait_status) : 128 + WTERMSIG(wait_status),
+      {},
+      killed_after};
   const std::string text = read_all_and_close(messages);
   for (size_t begin = 0, end; begin < text.size(); begin = end + 1) {
     end = text.find('\n', begin);

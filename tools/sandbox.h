@@ -27,21 +27,25 @@ void enter_private_namespace();
 /// top, or on empty memory-backed file systems when there is no image.
 class vell_device {
  public:
-  /// `image`: a directory holding var/db/timezone, or "" for none.
-  vell_device(const std::string& image, std::vector<std::string> entries);
+  /// `image`: a directory holding var/db/timezone, or "" for none;
+  /// `wheres`: the "FILE:LINE" of each entry, for the error when one cannot
+  /// be laid out.
+  vell_device(const std::string& image, std::vector<std::string> entries,
+              std::vector<std::string> wheres = {});
   ~vell_device();
   vell_device(const vell_device&) = delete;
   vell_device& operator=(const vell_device&) = delete;
 
   /// Lays the device out afresh, as it was before any start. Needs
-  /// enter_private_namespace; throws std::runtime_error when a mount fails.
+  /// enter_private_namespace; throws std::runtime_error when a mount fails,
+  /// and vell_try_error naming its line when an entry cannot be laid out.
   void reset();
 
  private:
   void unmount_all();
 
   int image_fd_ = -1;
-  std::vector<std::string> entries_;
+  std::vector<std::string> entries_, wheres_;
   std::vector<const char*> mounted_;  // in the order mounted
 };
 
@@ -56,7 +60,11 @@ inline constexpr int start_time_limit_seconds = 5;
 struct start_result {
   int status;                         // exit status, or 128 + signal number
   std::vector<std::string> messages;  // what it wrote to standard error, a line each
+  int killed_after = 0;               // seconds, when its time limit ended it
 };
+
+/// How a start ended: "exit status N" or "killed after S s".
+std::string ending(const start_result& result);
 
 /// Runs `vell` with no arguments, an empty environment and standard input
 /// from /dev/null, behind `wrapper` (such as strace and its arguments) when

@@ -50,7 +50,7 @@ std::string cell(std::string text) {
 
 void print_start(int number, const start_result& result, const std::vector<std::string>& before,
                  const std::vector<std::string>& after) {
-  std::printf("--- start %d: exit status %d\n", number, result.status);
+  std::printf("--- start %d: %s\n", number, ending(result).c_str());
   for (const std::string& message : result.messages) std::printf("  | %s\n", message.c_str());
   std::printf("  %-22s %-46s %s\n", "entry", "before", "after");
   for (size_t i = 0; i < written_paths.size(); ++i) {
@@ -104,9 +104,11 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
            "",
            sample_device(words.size() == 3 ? words[1] : "", words.size() == 3 ? words[2] : ""),
            {},
+           {},
            start_time_limit_seconds,
            false,
            {}});
+      all.back().device_where.assign(all.back().device.size(), where);
       continue;
     }
     if (all.empty()) throw unreadable("a scenario begins with a device line");
@@ -127,6 +129,7 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
       s.steps.push_back({where, text});
     } else if (!started && is_entry(text)) {
       s.device.push_back(text);
+      s.device_where.push_back(where);
     } else if (!started) {
       const bool expectation =
           words[0] == "active" || words[0] == "verdict" || text.starts_with("|");
@@ -148,36 +151,43 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
 }
 
 vell_scenario image_scenario(const std::string& image, int starts) {
-  vell_scenario s{image, "", image, {}, {}, start_time_limit_seconds, false, {}};
+  vell_scenario s{image, "", image, {}, {}, {}, start_time_limit_seconds, false, {}};
   s.steps.assign(starts, {image, "start"});
   return s;
 }
 
-std::vector<std::string> play(const vell_scenario& s, const vell_try_options& options) {
-  vell_device device(s.image, s.device);
+std::vector<vell_check> play(const vell_scenario& s, const vell_try_options& options) {
+  vell_device device(s.image, s.device, s.device_where);
   device.reset();
-  std::printf("=== %s%s\n", s.where.c_str(), s.title.empty() ? "" : (" " + s.title).c_str());
-  std::vector<std::string> failures;
+  const std::string suite = s.where + (s.title.empty() ? "" : " " + s.title);
+  std::printf("=== %s\n", suite.c_str());
+  // A check per expectation, in the order of the file; failures go to the
+  // step they are about.
+  std::vector<vell_check> checks(s.steps.size());
+  std::vector<bool> expected(s.steps.size());
   const auto fail = [&](const vell_step& step, const std::string& what) {
-    failures.push_back(step.where + ": " + what);
+    checks[&step - s.steps.data()].failures.push_back(step.where + ": " + what);
   };
-  int last_status = -1, number = 0;
+  start_result last{-1, {}};
+  int number = 0;
   const vell_step* verdict = nullptr;
   for (size_t i = 0; i < s.steps.size(); ++i) {
     const vell_step& step = s.steps[i];
     const std::vector<std::string> words = words_of(step.text);
+    expected[i] = true;
     if (const int status = start_status(step.text); status != -2) {
       const std::vector<std::string> before = written_state();
       const start_result result = run_start(options.vell, {}, s.limit_seconds);
       print_start(++number, result, before, written_state());
-      last_status = result.status;
-      if (status >= 0 && status != result.status)
-        fail(step, "expected exit status " + std::to_string(status) + ", found " +
-                       std::to_string(result.status));
+      last = result;
+      if (status >= 0 && (status != result.status || result.killed_after))
+        fail(step, "expected exit status " + std::to_string(status) + ", found " + ending(result));
       // The first message that differs: the ones after it would only repeat the shift.
       const size_t first = i + 1;
       size_t end = first;
       while (end < s.steps.size() && s.steps[end].text.starts_with("|")) ++end;
+      for (size_t m = first; m < end; ++m) expected[m] = status >= 0;
+      expected[i] = status >= 0;
       const size_t checked = status >= 0 ? std::max(end - first, result.messages.size()) : 0;
       for (size_t m = 0; m < checked; ++m) {
         const std::string got = m < result.messages.size() ? as_written(result.messages[m]) : "";
@@ -217,12 +227,25 @@ std::vector<std::string> play(const vell_scenario& s, const vell_try_options& op
     }
   }
   if (!options.then.empty()) run_then(options.then);
-  const std::string why = gate(options.vell, last_status);
+  int failed_stage = -1;
+  const std::string why = gate(options.vell, last, &failed_stage);
   if (verdict != nullptr && why != verdict->text.substr(8))
     fail(*verdict, "expected verdict " + in_quotes(verdict->text.substr(8)) + ", found " +
                        (why.empty() ? "pass" : in_quotes(why)));
-  if (verdict == nullptr && !why.empty()) failures.push_back(s.where + ": " + why);
-  return failures;
+  std::vector<vell_check> made;
+  for (size_t i = 0; i < s.steps.size(); ++i) {
+    if (!expected[i]) continue;
+    checks[i].suite = suite;
+    checks[i].name = s.steps[i].where + ": " + s.steps[i].text;
+    made.push_back(std::move(checks[i]));
+  }
+  // Without a verdict line the gate's own steps are checks too.
+  for (int stage = 0; verdict == nullptr && stage < gate_stages; ++stage) {
+    vell_check check{suite, gate_stage_names[stage], {}, failed_stage >= 0 && stage > failed_stage};
+    if (stage == failed_stage) check.failures.push_back(s.where + ": " + why);
+    made.push_back(std::move(check));
+  }
+  return made;
 }
 
 }  // namespace vell::sandbox

@@ -22,6 +22,7 @@
 #include <string>
 #include <vector>
 
+#include "tools/report.h"
 #include "tools/sandbox.h"
 
 namespace vell::sandbox {
@@ -36,6 +37,7 @@ struct vell_scenario {
   std::string title;                             // the comment naming it
   std::string image;                             // the image directory it runs on, or ""
   std::vector<std::string> device;               // the entries laid out before the first start
+  std::vector<std::string> device_where;         // "FILE:LINE" of each
   std::vector<vell_step> steps;                  // from the first start on
   int limit_seconds = start_time_limit_seconds;  // for each of its starts
   bool faults = false;
@@ -56,8 +58,10 @@ struct vell_try_options {
 
 /// Lays out the scenario, runs its starts with vell's messages and a table of
 /// what each start changed on standard output, then `then`, then checks the
-/// gate (verdict.h). Returns what did not hold, a line each ("WHERE: ...").
-std::vector<std::string> play(const vell_scenario& scenario, const vell_try_options& options);
+/// gate (verdict.h). Returns a check for each expectation, in the file's
+/// order, and for each step of the gate when no verdict line stands in for
+/// them; their failures say what did not hold ("WHERE: ...").
+std::vector<vell_check> play(const vell_scenario& scenario, const vell_try_options& options);
 
 }  // namespace vell::sandbox
 

@@ -113,10 +113,16 @@ std::string data_fingerprint() {
   return all;
 }
 
-std::string gate(const std::string& vell, int last_status) {
-  if (last_status != 0) return "the last start ended with status " + std::to_string(last_status);
+std::string gate(const std::string& vell, const start_result& last, int* failed_stage) {
+  int unused;
+  int& stage = failed_stage != nullptr ? *failed_stage : unused;
+  stage = 0;
+  if (last.killed_after) return "the last start was " + ending(last);
+  if (last.status != 0) return "the last start ended with status " + std::to_string(last.status);
+  stage = 1;
   if (std::string why = unusable_links(); !why.empty())
     return "the links do not lead to usable data: " + why;
+  stage = 2;
   const std::vector<std::string> before = written_state();
   run_start(vell);
   const std::vector<std::string> after = written_state();
@@ -126,6 +132,7 @@ std::string gate(const std::string& vell, int last_status) {
       return "one more start changed " + written_paths[i] + ": " + before[i] + " became " +
              after[i];
   }
+  stage = -1;
   return "";
 }
 

@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "tools/sandbox.h"
+
 namespace vell::sandbox {
 
 /// Every path a start may write, in the order vell-try's table shows them.
@@ -24,11 +26,18 @@ std::string unusable_links();
 /// mode, size, time of change and link target: what no start may change.
 std::string data_fingerprint();
 
-/// The verdict an image pipeline gates on, given the last start's status:
-/// "" when it ended with 0, the links lead to usable data and one more start
-/// of `vell` changes none of written_paths but the clean-up marker (which
-/// every start deletes); otherwise the first of these that failed, and why.
-std::string gate(const std::string& vell, int last_status);
+/// The steps of the verdict an image pipeline gates on, in order.
+inline constexpr int gate_stages = 3;
+inline constexpr const char* gate_stage_names[gate_stages] = {
+    "the last start ended with 0", "the links lead to usable data",
+    "one more start changed nothing but the clean-up marker"};
+
+/// That verdict, given how the last start ended: "" when it ended with 0, the
+/// links lead to usable data and one more start of `vell` changes none of
+/// written_paths but the clean-up marker (which every start deletes);
+/// otherwise the first of these that failed, and why, with its number in
+/// gate_stage_names in `*failed_stage` when given.
+std::string gate(const std::string& vell, const start_result& last, int* failed_stage = nullptr);
 
 }  // namespace vell::sandbox
 
