@@ -85,11 +85,7 @@ std::string check(const fault_point& point, const std::string& fault, const std:
 }  // namespace
 
 std::string find_strace() {
-  const char* path = std::getenv("PATH");
-  std::istringstream dirs(path != nullptr ? path : "/usr/bin:/bin");
-  for (std::string dir; std::getline(dirs, dir, ':');) {
-    if (!dir.empty() && access((dir + "/strace").c_str(), X_OK) == 0) return dir + "/strace";
-  }
+  if (std::string strace = on_path("strace"); !strace.empty()) return strace;
   throw vell_try_error(
       "--faults needs strace, which is not on PATH (Debian: apt-get install strace)");
 }

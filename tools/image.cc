@@ -27,6 +27,17 @@ bool at(const std::string& head, size_t offset, const std::string& magic) {
   return head.size() >= offset + magic.size() && head.compare(offset, magic.size(), magic) == 0;
 }
 
+// The first `size` bytes of `path` (fewer when it is shorter).
+std::string first_bytes(const std::string& path, size_t size) {
+  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) throw vell_try_error(path + ": " + std::strerror(errno));
+  std::string head(size, '\0');
+  const ssize_t n = pread(fd, head.data(), head.size(), 0);
+  close(fd);
+  head.resize(n < 0 ? 0 : n);
+  return head;
+}
+
 // Runs `argv` with standard output discarded; its status, and its standard error.
 std::pair<int, std::string> run_tool(const std::vector<std::string>& argv) {
   std::vector<char*> args;
@@ -85,12 +96,7 @@ image_kind kind_of(const std::string& path) {
   struct stat st;
   if (stat(path.c_str(), &st) != 0) throw vell_try_error(path + ": " + std::strerror(errno));
   if (S_ISDIR(st.st_mode)) return image_kind::directory;
-  const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-  if (fd < 0) throw vell_try_error(path + ": " + std::strerror(errno));
-  std::string head(4096, '\0');
-  const ssize_t n = pread(fd, head.data(), head.size(), 0);
-  close(fd);
-  head.resize(n < 0 ? 0 : n);
+  const std::string head = first_bytes(path, 4096);
   if (at(head, 0, "hsqs")) return image_kind::squashfs;
   if (at(head, 1080, "\x53\xef")) return image_kind::ext;
   if (at(head, 1024, "\xe2\xe1\xf5\xe0")) return image_kind::erofs;
@@ -111,17 +117,30 @@ void unpack(const std::string& image, image_kind kind, const std::string& into) 
   const std::string var = into + "/var", share = into + "/usr/share";
   for (const std::string& dir : {var, into + "/usr", share}) mkdir(dir.c_str(), 0755);
   switch (kind) {
-    case image_kind::tar:
+    case image_kind::tar: {
+      // The whole archive is read to find the members: with a decompressor
+      // that uses every core where one is at hand (xz's threads only help an
+      // archive compressed in blocks, as xz -T makes them).
+      std::vector<std::string> tar{"tar", "-x", "-f", image, "-C", into, "--no-same-owner"};
+      const std::string head = first_bytes(image, 6);
+      if (at(head, 0, "BZh") && !on_path("lbzip2").empty())
+        tar.push_back("--use-compress-program=lbzip2");
+      if (at(head, 0,
+             "\xfd"
+             "7zXZ"))
+        tar.push_back("--use-compress-program=xz -T0");
       // Members are named "var/db/..." or "./var/db/...", as the archive was
       // made: both are asked for, and the form it lacks is not found.
-      run_or_throw({"tar", "-x", "-f", image, "-C", into, "--no-same-owner", "var/db", "./var/db",
-                    "usr/share/zoneinfo.default", "./usr/share/zoneinfo.default", "usr/share/icu",
-                    "./usr/share/icu"},
-                   image, [](const std::string& line) {
-                     return line.ends_with("Not found in archive") ||
-                            line.starts_with("tar: Exiting with failure status");
-                   });
+      for (const char* member :
+           {"var/db", "./var/db", "usr/share/zoneinfo.default", "./usr/share/zoneinfo.default",
+            "usr/share/icu", "./usr/share/icu"})
+        tar.push_back(member);
+      run_or_throw(tar, image, [](const std::string& line) {
+        return line.ends_with("Not found in archive") ||
+               line.starts_with("tar: Exiting with failure status");
+      });
       break;
+    }
     case image_kind::ext: {
       // debugfs reads the file system itself, without mounting it; a wanted
       // folder it lacks is only a message.

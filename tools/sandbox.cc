@@ -11,7 +11,9 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
+#include <sstream>
 
 #include "tools/notation.h"
 
@@ -145,6 +147,16 @@ void vell_device::reset() {
                            entries_[i] + ": " + e.what());
     }
   }
+}
+
+std::string on_path(const std::string& program) {
+  const char* path = std::getenv("PATH");
+  std::istringstream dirs(path != nullptr ? path : "/usr/bin:/bin");
+  for (std::string dir; std::getline(dirs, dir, ':');) {
+    if (!dir.empty() && access((dir + "/" + program).c_str(), X_OK) == 0)
+      return dir + "/" + program;
+  }
+  return "";
 }
 
 std::string ending(const start_result& result) {

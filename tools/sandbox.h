@@ -54,6 +54,9 @@ class vell_device {
 /// may write are the caller's user's and group's.
 void check_image(const std::string& image);
 
+/// Where `program` is on PATH, or "" when it is not.
+std::string on_path(const std::string& program);
+
 /// How long one start may run before it is killed, unless a scenario says.
 inline constexpr int start_time_limit_seconds = 5;
 
