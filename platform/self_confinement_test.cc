@@ -21,6 +21,18 @@
 namespace vell::platform {
 namespace {
 
+#if defined(__SANITIZE_ADDRESS__)
+constexpr bool leak_check_at_exit = true;
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer) || __has_feature(leak_sanitizer)
+constexpr bool leak_check_at_exit = true;
+#else
+constexpr bool leak_check_at_exit = false;
+#endif
+#else
+constexpr bool leak_check_at_exit = false;
+#endif
+
 // A call with arguments that make it fail harmlessly should it get through.
 struct call_case {
   const char* name;
@@ -89,7 +101,9 @@ TEST(SelfConfinement, KeepsOnlyDacOverride) {
   for (const std::string set : {"CapEff", "CapPrm", "CapBnd", "CapInh", "CapAmb"}) {
     const unsigned long long held = std::stoull(field(status, set), nullptr, 16);
     EXPECT_EQ(held & ~dac_override, 0u) << set;
-    if (geteuid() == 0 && set != "CapInh" && set != "CapAmb") EXPECT_EQ(held, dac_override) << set;
+    if (geteuid() == 0 && set != "CapInh" && set != "CapAmb") {
+      EXPECT_EQ(held, dac_override) << set;
+    }
   }
 }
 
@@ -124,10 +138,8 @@ TEST(SelfConfinement, RefusesWhatVellHasNoUseFor) {
       {"bpf", SYS_bpf, -1, 0, 0, true},
       {"set_mempolicy_home_node, the last", SYS_set_mempolicy_home_node, 0, 0, 0, true},
   };
-#if !defined(__SANITIZE_ADDRESS__) && !(defined(__has_feature) && __has_feature(address_sanitizer))
   // Builds with a leak check keep ptrace: the check stops the process's threads with it at exit.
-  calls.push_back({"ptrace", SYS_ptrace, 0, 0, 0, true});
-#endif
+  if (!leak_check_at_exit) calls.push_back({"ptrace", SYS_ptrace, 0, 0, 0, true});
   const auto [errors, status] = run_confined(calls);
   EXPECT_EQ(field(status, "Seccomp"), "2");
   EXPECT_EQ(errors[0], 0) << "errno must be left as it was";
