@@ -20,14 +20,6 @@
 #define VELL_AUDIT_ARCH AUDIT_ARCH_ARM
 #endif
 
-#if defined(__SANITIZE_ADDRESS__)
-#define VELL_LEAK_CHECK_AT_EXIT 1
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer) || __has_feature(leak_sanitizer)
-#define VELL_LEAK_CHECK_AT_EXIT 1
-#endif
-#endif
-
 namespace vell::platform {
 namespace {
 

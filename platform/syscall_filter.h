@@ -4,7 +4,23 @@
 #ifndef VELL_PLATFORM_SYSCALL_FILTER_H_
 #define VELL_PLATFORM_SYSCALL_FILTER_H_
 
+// A leak sanitizer stops the process's threads with ptrace for its check at
+// exit, so builds with one keep that call.
+#if defined(__SANITIZE_ADDRESS__)
+#define VELL_LEAK_CHECK_AT_EXIT 1
+#elif defined(__has_feature)
+#if __has_feature(address_sanitizer) || __has_feature(leak_sanitizer)
+#define VELL_LEAK_CHECK_AT_EXIT 1
+#endif
+#endif
+
 namespace vell::platform {
+
+#ifdef VELL_LEAK_CHECK_AT_EXIT
+inline constexpr bool filter_keeps_ptrace = true;
+#else
+inline constexpr bool filter_keeps_ptrace = false;
+#endif
 
 /// From now on these system calls fail with EPERM in this process: loading
 /// modules, mounting, rebooting and kexec, swap, setting clocks, raw I/O,
