@@ -11,6 +11,7 @@
 
 #include <array>
 #include <iterator>
+#include <utility>
 
 #if defined(__x86_64__)
 #define VELL_AUDIT_ARCH AUDIT_ARCH_X86_64
@@ -147,96 +148,105 @@ constexpr __u32 new_namespaces = CLONE_NEWNS | CLONE_NEWCGROUP | CLONE_NEWUTS | 
 constexpr __u32 clone_flags =
     offsetof(seccomp_data, args[0]) + (__BYTE_ORDER__ == __ORDER_BIG_ENDIAN__ ? sizeof(__u32) : 0);
 
-constexpr sock_filter statement(__u16 code, __u32 k) { return BPF_STMT(code, k); }
-constexpr sock_filter jump(__u16 code, __u32 k, __u8 if_true, __u8 if_false) {
-  return BPF_JUMP(code, k, if_true, if_false);
-}
-constexpr sock_filter allow = statement(BPF_RET | BPF_K, SECCOMP_RET_ALLOW);
-constexpr sock_filter refuse = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM);
+// What the filter does with a call number. clone3 passes its flags in memory
+// that a filter cannot read, so it fails as unknown (a C library then falls
+// back to clone); clone is refused with a flag for a new namespace.
+enum answer : unsigned char { allow, refuse, unknown, check_clone_flags };
 
-// The call numbers where the answer changes, from allowed (below the first)
-// to refused and back: the denied calls as runs of consecutive numbers.
+// The call numbers as intervals of one answer each, in order: interval i
+// holds the numbers from start[i] up to the next start.
 constexpr size_t call_count = std::size(denied);
-constexpr std::array<long, call_count> sorted_calls = [] {
-  std::array<long, call_count> calls{};
-  for (size_t i = 0; i < call_count; ++i) {
-    size_t j = i;
-    for (; j > 0 && calls[j - 1] > denied[i]; --j) calls[j] = calls[j - 1];
-    calls[j] = denied[i];
+struct interval_table {
+  std::array<__u32, 2 * call_count + 6> start{};
+  std::array<answer, 2 * call_count + 6> says{};
+  size_t count = 0;
+  constexpr void add(__u32 from, answer a) {
+    if (count > 0 && start[count - 1] == from) --count;  // an empty interval
+    if (count > 0 && says[count - 1] == a) return;
+    start[count] = from;
+    says[count++] = a;
   }
-  return calls;
-}();
-constexpr size_t change_count = [] {
-  size_t runs = 0;
-  for (size_t i = 0; i < call_count; ++i)
-    runs += i == 0 || sorted_calls[i] != sorted_calls[i - 1] + 1;
-  return 2 * runs;
-}();
-constexpr std::array<__u32, change_count> changes = [] {
-  std::array<__u32, change_count> at{};
-  size_t n = 0;
-  for (size_t i = 0; i < call_count; ++i) {
-    if (i == 0 || sorted_calls[i] != sorted_calls[i - 1] + 1) at[n++] = sorted_calls[i];
-    if (i + 1 == call_count || sorted_calls[i + 1] != sorted_calls[i] + 1)
-      at[n++] = sorted_calls[i] + 1;
-  }
-  return at;
-}();
-
-// Before the search: another architecture's calls (and on x86-64 those of
-// the x32 ABI, which shares the architecture and sets this bit) are refused;
-// clone3 passes its flags in memory that a filter cannot read, so it fails
-// as unknown (a C library then falls back to clone); clone is refused with
-// a flag for a new namespace.
-constexpr sock_filter head[] = {
-    statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, arch)),
-    jump(BPF_JMP | BPF_JEQ | BPF_K, VELL_AUDIT_ARCH, 1, 0),
-    refuse,
-    statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-#if defined(__x86_64__)
-    jump(BPF_JMP | BPF_JGE | BPF_K, 0x40000000, 0, 1),
-    refuse,
-#endif
-    jump(BPF_JMP | BPF_JEQ | BPF_K, SYS_clone3, 0, 1),
-    statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS),
-    jump(BPF_JMP | BPF_JEQ | BPF_K, SYS_clone, 0, 4),
-    statement(BPF_LD | BPF_W | BPF_ABS, clone_flags),
-    jump(BPF_JMP | BPF_JSET | BPF_K, new_namespaces, 1, 0),
-    allow,
-    refuse,
-    // The search expects the call number again.
-    statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
 };
-
-// Then a binary search of the changes: the kernel runs a filter once for
-// every call number when it is installed, to learn which calls it may let
-// through without running it, and the install costs about 2 microseconds per
-// instruction of a filter that lists every call; a search has half the
-// instructions and runs a few of them.
-constexpr size_t search_size = 2 * change_count + 1;
-// Writes the search for a call number with at least `low` and fewer than
-// `high` changes at or below it, from `at`; returns where it ended.
-constexpr size_t search(std::array<sock_filter, search_size>& code, size_t at, size_t low,
-                        size_t high) {
-  if (low == high) {
-    code[at] = low % 2 ? refuse : allow;
-    return at + 1;
+constexpr interval_table intervals = [] {
+  struct call {
+    long number;
+    answer says;
+  };
+  std::array<call, call_count + 2> calls{};
+  for (size_t i = 0; i < call_count; ++i) calls[i] = {denied[i], refuse};
+  calls[call_count] = {SYS_clone3, unknown};
+  calls[call_count + 1] = {SYS_clone, check_clone_flags};
+  for (size_t i = 1; i < calls.size(); ++i)
+    for (size_t j = i; j > 0 && calls[j - 1].number > calls[j].number; --j)
+      std::swap(calls[j - 1], calls[j]);
+  interval_table table;
+  table.add(0, allow);
+  for (const call& c : calls) {
+    table.add(c.number, c.says);
+    table.add(c.number + 1, allow);
   }
-  const size_t middle = low + (high - low) / 2;
-  const size_t below = 2 * (middle - low) + 1;
-  code[at] = jump(BPF_JMP | BPF_JGE | BPF_K, changes[middle], below, 0);
-  return search(code, search(code, at + 1, low, middle), middle + 1, high);
-}
-constexpr std::array<sock_filter, std::size(head) + search_size> program = [] {
-  std::array<sock_filter, search_size> tree{};
-  search(tree, 0, 0, change_count);
-  std::array<sock_filter, std::size(head) + search_size> all{};
-  for (size_t i = 0; i < std::size(head); ++i) all[i] = head[i];
-  for (size_t i = 0; i < search_size; ++i) all[std::size(head) + i] = tree[i];
-  return all;
+#if defined(__x86_64__)
+  // The x32 ABI shares the architecture and sets this bit of the number.
+  table.add(0x40000000, refuse);
+#endif
+  return table;
 }();
-static_assert(2 * (change_count / 2) + 1 <= 255,
-              "a jump of the search reaches past 255 instructions");
+static_assert(intervals.count >= 2);
+
+constexpr sock_filter statement(__u16 code, __u32 k) { return BPF_STMT(code, k); }
+constexpr __u8 distance(size_t from, size_t to) {
+  if (to <= from || to - from - 1 > 255) throw "a jump of the filter reaches past 255 instructions";
+  return to - from - 1;
+}
+
+// The kernel runs a filter once for every call number when it is installed,
+// to learn which calls it may let through without running it again; that
+// run, and the filter's size, are most of what installing costs. So the
+// filter checks the architecture and then searches the intervals, its
+// branches jumping to shared answers at its end: a few instructions run per
+// number.
+constexpr size_t search_at = 3;
+constexpr size_t answers_at = search_at + intervals.count - 1;
+constexpr size_t where(answer a) {
+  switch (a) {
+    case check_clone_flags:
+      return answers_at;
+    case refuse:
+      return answers_at + 2;
+    case allow:
+      return answers_at + 3;
+    case unknown:
+      return answers_at + 4;
+  }
+  return 0;
+}
+using program_code = std::array<sock_filter, answers_at + 5>;
+// Writes the search of intervals low to high (not included) at `at`;
+// returns where it ended.
+constexpr size_t search(program_code& code, size_t at, size_t low, size_t high) {
+  const size_t middle = low + (high - low) / 2;
+  size_t next = at + 1;
+  const size_t below = middle - low == 1 ? where(intervals.says[low]) : next;
+  if (middle - low > 1) next = search(code, next, low, middle);
+  const size_t above = high - middle == 1 ? where(intervals.says[middle]) : next;
+  if (high - middle > 1) next = search(code, next, middle, high);
+  code[at] = BPF_JUMP(BPF_JMP | BPF_JGE | BPF_K, intervals.start[middle], distance(at, above),
+                      distance(at, below));
+  return next;
+}
+constexpr program_code program = [] {
+  program_code code{};
+  code[0] = statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, arch));
+  code[1] = BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, VELL_AUDIT_ARCH, 0, distance(1, where(refuse)));
+  code[2] = statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr));
+  if (search(code, search_at, 0, intervals.count) != answers_at) throw "the search is misplaced";
+  code[answers_at] = statement(BPF_LD | BPF_W | BPF_ABS, clone_flags);
+  code[answers_at + 1] = BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, new_namespaces, 0, 1);
+  code[answers_at + 2] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM);
+  code[answers_at + 3] = statement(BPF_RET | BPF_K, SECCOMP_RET_ALLOW);
+  code[answers_at + 4] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS);
+  return code;
+}();
 #endif
 
 }  // namespace
