@@ -100,10 +100,11 @@ std::vector<vell_check> sweep(const vell_scenario& s, const std::string& vell,
   if (points.empty())
     checks.push_back(
         {suite, "fault points", {s.where + ": strace saw no file-system call of vell"}});
-  std::set<std::string> failing;
+  std::set<std::string> swept, failing;
   for (const fault_point& point : points) {
     for (const char* fault : {"error=EIO", "signal=KILL"}) {
       const std::string key = (fault[0] == 'e' ? "eio " : "kill ") + point.label;
+      swept.insert(key);
       device.reset();
       const std::string problem = check(point, fault, vell, strace);
       vell_check& made = checks.emplace_back(vell_check{suite, key, {}});
@@ -116,7 +117,10 @@ std::vector<vell_check> sweep(const vell_scenario& s, const std::string& vell,
   for (const vell_step& step : s.known) {
     vell_check& made =
         checks.emplace_back(vell_check{suite, step.where + ": known " + step.text, {}});
-    if (!failing.contains(step.text))
+    // A misspelt point would otherwise pass for one that now holds.
+    if (!swept.contains(step.text))
+      made.failures.push_back(step.where + ": known, but no such fault point: " + step.text);
+    else if (!failing.contains(step.text))
       made.failures.push_back(step.where + ": known, now holds: " + step.text);
   }
   std::printf("=== %s: %zu fault points, %zu leave the device unusable (%zu known)\n",
