@@ -10,8 +10,9 @@
 namespace vell::sandbox {
 namespace {
 
-// Text as XML 1.0 takes it: markup escaped, and bytes that are no printable
-// ASCII (a scenario's paths may hold any) written out as \xNN.
+// Text as XML 1.0 takes it: markup, line breaks and tabs escaped, and bytes
+// that are no printable ASCII (a scenario's paths may hold any) written out as
+// \xNN.
 std::string xml(const std::string& text) {
   std::string out;
   for (const unsigned char c : text) {
@@ -23,7 +24,9 @@ std::string xml(const std::string& text) {
       out += "&gt;";
     else if (c == '"')
       out += "&quot;";
-    else if (c == '\n' || c == '\t' || (c >= 0x20 && c < 0x7f))
+    else if (c == '\n' || c == '\t')  // as references, which an attribute keeps
+      out += c == '\n' ? "&#10;" : "&#9;";
+    else if (c >= 0x20 && c < 0x7f)
       out += static_cast<char>(c);
     else {
       char escaped[8];
