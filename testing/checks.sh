@@ -9,6 +9,17 @@ check() {  # check NAME COMMAND...: one check; on failure, the last of what it p
 }
 summary() { echo "$passed passed, $failed failed"; [ "$failed" -eq 0 ]; }
 
+# $try's status and output on IMAGE with $vell, the image's name and the
+# scenario lines taken out; as nobody when asked and run as root.
+tried() {  # tried [nobody] IMAGE ARG...
+  local as=()
+  [ "$1" = nobody ] && { [ "$(id -u)" -ne 0 ] || as=(setpriv --reuid=nobody --regid=nogroup --clear-groups); shift; }
+  local image=$1
+  shift
+  "${as[@]}" "$try" --vell "$vell" "$@" "$image" 2>&1 | sed "s|$image|IMAGE|g; /^=== /d"
+  echo "status ${PIPESTATUS[0]}"
+}
+
 # The confinement vell ended boot N with, in BOOTS ("boot N observed NAME
 # VALUE" lines, dev/observe-vell): CAP_DAC_OVERRIDE alone, no new
 # privileges, and a system-call filter.
