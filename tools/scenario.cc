@@ -123,7 +123,7 @@ std::vector<vell_scenario> read_scenarios(const std::string& file, int starts) {
         throw unreadable("limit takes 1 to 60 seconds");
     } else if (words[0] == "known") {
       if (words.size() < 3 || (words[1] != "eio" && words[1] != "kill"))
-        throw unreadable("known takes eio or kill, a call and a path");
+        throw unreadable("known takes eio or kill and a fault point");
       s.known.push_back({where, text.substr(6)});
     } else if (start_status(text) != -2) {
       s.steps.push_back({where, text});
