@@ -9,6 +9,15 @@ check() {  # check NAME COMMAND...: one check; on failure, the last of what it p
 }
 summary() { echo "$passed passed, $failed failed"; [ "$failed" -eq 0 ]; }
 
+# COMMAND ends with STATUS and says TEXT; if not, the command to run by hand.
+said() {  # said STATUS TEXT COMMAND...
+  local want=$1 text=$2 out status
+  shift 2
+  out=$("$@" 2>&1)
+  status=$?
+  [ $status -eq "$want" ] && grep -qF -- "$text" <<<"$out" || { echo "\$ $*"; echo "$out"; echo "status $status"; return 1; }
+}
+
 # $try's status and output on IMAGE with $vell, the image's name and the
 # scenario lines taken out; as nobody when asked and run as root.
 tried() {  # tried [nobody] IMAGE ARG...
