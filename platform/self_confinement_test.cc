@@ -1,19 +1,27 @@
 #include <errno.h>
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <linux/capability.h>
 #include <linux/filter.h>
+#include <linux/landlock.h>
 #include <linux/seccomp.h>
 #include <sched.h>
+#include <signal.h>
 #include <sys/mount.h>
 #include <sys/prctl.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstdio>
+#include <cstdlib>
+#include <string>
 #include <vector>
 
 #include "platform/capabilities.h"
+#include "platform/confinement.h"
+#include "platform/run_limit.h"
 #include "platform/syscall_filter.h"
 
 namespace vell::platform {
@@ -26,14 +34,27 @@ struct call_case {
   int refused_with;  // 0: it must get through (any other result)
 };
 
-// In a child confined as vell confines itself, each call's errno against its
-// case: mismatches are printed and counted in the exit status, as is errno
-// not left as it was. That only CAP_DAC_OVERRIDE is left is checked at every
-// boot, on vell's own /proc status.
-int mismatches_when_confined(const std::vector<call_case>& calls) {
+// A child bounds itself as vell's main does, in its order: its run time
+// (SIGALRM ignored and blocked by its caller), its writes beneath `inside`
+// (after a confinement beneath a missing folder, which must change nothing),
+// its capabilities, its system calls. It tries each call and creates each
+// file, prints each errno that differs from its case and exits with their
+// count (errno not left as it was counts too); with none it waits, and
+// SIGALRM must end it. Returns the wait status. That only CAP_DAC_OVERRIDE is
+// left is checked at every boot, on vell's own /proc status.
+int bounded_child(const std::string& inside, const std::vector<call_case>& calls,
+                  const std::vector<std::pair<std::string, int>>& creates) {
   const pid_t child = fork();
   if (child == 0) {
+    sigset_t alarm_only;
+    sigemptyset(&alarm_only);
+    sigaddset(&alarm_only, SIGALRM);
+    sigprocmask(SIG_BLOCK, &alarm_only, nullptr);
+    signal(SIGALRM, SIG_IGN);
     errno = EXDEV;
+    limit_run_time(1);
+    confine_writes_beneath((inside + "/missing").c_str());
+    confine_writes_beneath(inside.c_str());
     keep_only_capability(CAP_DAC_OVERRIDE);
     deny_unneeded_system_calls();
     int mismatches = errno != EXDEV;
@@ -45,11 +66,24 @@ int mismatches_when_confined(const std::vector<call_case>& calls) {
         ++mismatches;
       }
     }
-    _exit(mismatches);
+    for (const auto& [path, refused_with] : creates) {
+      const int error = open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0644) < 0 ? errno : 0;
+      if (error != refused_with) {
+        std::fprintf(stderr, "create %s: errno %d\n", path.c_str(), error);
+        ++mismatches;
+      }
+    }
+    if (mismatches) _exit(mismatches);
+    for (;;) pause();
   }
   int status = 0;
-  waitpid(child, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  for (int tenth = 0; tenth < 30 && waitpid(child, &status, WNOHANG) != child; ++tenth)
+    usleep(100000);
+  if (status == 0) {  // still running
+    kill(child, SIGKILL);
+    waitpid(child, nullptr, 0);
+  }
+  return status;
 }
 
 // Whether a child can install a filter at all, apart from the code under
@@ -66,9 +100,15 @@ bool kernel_takes_filters() {
   return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }
 
-TEST(SelfConfinement, RefusesWhatVellHasNoUseFor) {
+TEST(SelfConfinement, BoundsAStartAsVellDoes) {
   if (!kernel_takes_filters())
     GTEST_SKIP() << "this kernel (or emulator) takes no seccomp filter: " << strerror(errno);
+  if (syscall(SYS_landlock_create_ruleset, nullptr, 0, LANDLOCK_CREATE_RULESET_VERSION) < 1)
+    GTEST_SKIP() << "this kernel (or emulator) has no Landlock: " << strerror(errno);
+  char top[] = "/tmp/vell-confinement.XXXXXX";
+  ASSERT_NE(mkdtemp(top), nullptr);
+  const std::string inside = std::string(top) + "/db";
+  ASSERT_EQ(mkdir(inside.c_str(), 0755), 0);
   // Denied calls at either end of a run of denied numbers (on x86-64), and
   // the allowed calls beside them; clone3 must look unknown, so that a C
   // library falls back to clone, which is refused a new namespace only.
@@ -94,7 +134,12 @@ TEST(SelfConfinement, RefusesWhatVellHasNoUseFor) {
 #endif
   };
   if (!filter_keeps_ptrace) calls.push_back({"ptrace", SYS_ptrace, 0, EPERM});
-  EXPECT_EQ(mismatches_when_confined(calls), 0);
+  const int status = bounded_child(inside, calls,
+                                   {{inside + "/timezone", 0},
+                                    {std::string(top) + "/beside", EACCES},
+                                    {inside + "/../through-dot-dot", EACCES}});
+  EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGALRM) << "wait status " << status;
+  std::system(("rm -rf " + std::string(top)).c_str());
 }
 
 }  // namespace
