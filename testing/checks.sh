@@ -8,6 +8,8 @@ check() {  # check NAME COMMAND...: one check; on failure, the last of what it p
     failed=$((failed + 1)); echo "FAILED: $name"; echo "$output" | tail -20 | sed 's/^/  /'; fi
 }
 summary() { echo "$passed passed, $failed failed"; [ "$failed" -eq 0 ]; }
+# What stops the checks short counts as one failed.
+die() { echo "$(basename "$0"): $*" >&2; echo "$passed passed, $((failed + 1)) failed"; exit 1; }
 
 # COMMAND ends with STATUS and says TEXT; if not, the command to run by hand.
 said() {  # said STATUS TEXT COMMAND...
