@@ -28,7 +28,7 @@ std::string first_word(const std::string& path) {
 }
 
 // True when the folder `icutz` holds, directly, a regular file readable by
-// others and named for `schema`.
+// others and named for `schema`, or for any schema when it is empty.
 bool has_icu_data_for(const std::string& icutz, const std::string& schema) {
   static const std::regex name("icutz([0-9]+[lbe])\\.dat");
   DIR* dir = opendir(icutz.c_str());
@@ -36,7 +36,7 @@ bool has_icu_data_for(const std::string& icutz, const std::string& schema) {
   for (const dirent* entry; dir != nullptr && !found && (entry = readdir(dir)) != nullptr;) {
     std::cmatch m;
     struct stat st;
-    found = std::regex_match(entry->d_name, m, name) && m.str(1) == schema &&
+    found = std::regex_match(entry->d_name, m, name) && (schema.empty() || m.str(1) == schema) &&
             lstat((icutz + "/" + entry->d_name).c_str(), &st) == 0 && S_ISREG(st.st_mode) &&
             (st.st_mode & S_IROTH) != 0;
   }
@@ -62,6 +62,12 @@ std::vector<std::string> written_state() {
 }
 
 std::string unusable_links() {
+  // What an ordinary root lacks; vell would point the links at it all the same.
+  struct stat st;
+  if (stat(system_zoneinfo.c_str(), &st) != 0 || !S_ISDIR(st.st_mode) ||
+      first_word(system_zoneinfo + "/+VERSION").empty())
+    return "the image has no system data: " + system_zoneinfo +
+           " with the tz release in its +VERSION (vell-layout root lays it out)";
   const std::string zoneinfo = what_stands(data_dir + "zoneinfo");
   const std::string target = zoneinfo.starts_with("-> ") ? zoneinfo.substr(3) : "";
   std::string dataset;  // "" for the system data
@@ -75,8 +81,12 @@ std::string unusable_links() {
     if (name.empty() || name.find('/') != std::string::npos)
       return "zoneinfo is " + zoneinfo + ", neither the system data nor a download";
     dataset = downloads + name;
+    // A device without ICU data takes downloads without any.
     const std::string schema = first_word("/usr/share/icu/icutzformat.txt");
-    if (schema.empty() || !has_icu_data_for(dataset + "/icutz", schema))
+    if (schema.empty() && has_icu_data_for(dataset + "/icutz", ""))
+      return "zoneinfo names " + dataset +
+             ", whose ICU data the system, which has none, cannot use";
+    if (!schema.empty() && !has_icu_data_for(dataset + "/icutz", schema))
       return "zoneinfo names " + dataset +
              ", which has no ICU data file for the system's schema \"" + schema + "\"";
   }
@@ -85,7 +95,6 @@ std::string unusable_links() {
     return "icutz is " + icutz + " while zoneinfo names " +
            (dataset.empty() ? "the system data" : dataset);
   const std::string localtime = what_stands(data_dir + "localtime");
-  struct stat st;
   if (!localtime.starts_with("-> " + data_dir + "zoneinfo/") ||
       stat((data_dir + "localtime").c_str(), &st) != 0 || !S_ISREG(st.st_mode))
     return "localtime is " + localtime + ", not a link through zoneinfo to a zone file";
