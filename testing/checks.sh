@@ -42,20 +42,29 @@ confined() {  # confined BOOTS N
   done
 }
 
-# What two boots and a confinement boot of an init other than systemd
-# (dev/boot-init) must show on the sample device whose update is UPDATE.
-init_boot_checks() {  # init_boot_checks LABEL BOOTS UPDATE
-  local label=$1 boots=$2 update=$3
+# What the boots of an init other than systemd (dev/boot-init) must show:
+# the system's data kept at the first, where the readers see Europe/Paris as
+# this machine's zones have it now; the update placed after it promoted at
+# the second before the first reader, which sees +0530; nothing changed at
+# the third; vell's writes refused outside /var/db at the fourth.
+init_boot_checks() {  # init_boot_checks LABEL BOOTS
+  local label=$1 boots=$2 paris
+  paris=$(TZ=Europe/Paris date +%z)
   v() { sed -n "s/^boot $1 $2 //p" <<<"$boots" | head -1; }
-  check "$label: vell ran after the local mounts and before the first reader" \
-    test "$(v 1 'reader localtime')" = /var/db/timezone/zoneinfo/Europe/Paris
-  check "$label: the update promoted" test "$(v 1 'link zoneinfo')" = "/var/db/timezone/tz/$update/zoneinfo"
-  check "$label: vell's messages on the console" grep -q "^boot 1 message Correcting localtime link" <<<"$boots"
-  check "$label: status 0" test -z "$(grep '^boot [12] message Cannot repair' <<<"$boots")"
-  check "$label: the second boot changed nothing" test "$(grep '^boot 1 link' <<<"$boots")" = \
-    "$(grep '^boot 2 link' <<<"$boots" | sed 's/^boot 2/boot 1/')"
+  check "$label: boot 1 keeps the system's data" test "$(v 1 'link zoneinfo')" = /usr/share/zoneinfo.default
+  check "$label: ...where date and localtime(3) tell Europe/Paris's time" \
+    test "$(v 1 'reader date')/$(v 1 'reader localtime(3)')" = "$paris/$paris"
+  check "$label: vell's messages on the console" grep -q "^boot 3 message New update not compatible" <<<"$boots"
+  check "$label: boot 2 promotes the update placed after boot 1" \
+    test "$(v 2 'link zoneinfo')" = "$(sed -n 's/^placed //p' <<<"$boots")/zoneinfo"
+  check "$label: ...before the first reader: date and localtime(3) tell the update's +0530" \
+    test "$(v 2 'reader date')/$(v 2 'reader localtime(3)')/$(v 2 'reader localtime')" = \
+    "+0530/+0530/$(v 1 'reader localtime')"
+  check "$label: status 0" test -z "$(grep '^boot [123] message Cannot repair' <<<"$boots")"
+  check "$label: boot 3 changed nothing" test "$(grep '^boot 2 link' <<<"$boots")" = \
+    "$(grep '^boot 3 link' <<<"$boots" | sed 's/^boot 3/boot 2/')"
   check "$label: vell's writes outside /var/db refused by its own confinement" \
-    grep -q '^boot 3 message create_symlink: .*: Permission denied$' <<<"$boots"
+    grep -q '^boot 4 message create_symlink: .*: Permission denied$' <<<"$boots"
   check "$label: vell confined itself: CAP_DAC_OVERRIDE alone, no new privileges, a filter" confined "$boots" 1
   check "$label: ...its own, one more than the init and its container give" \
     test "$(v 1 'observed Seccomp_filters')" = "$(($(v 1 filters) + 1))"

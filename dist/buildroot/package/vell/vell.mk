@@ -34,6 +34,16 @@ endif
 # vell-try.
 VELL_INSTALL_TARGET_OPTS = --component vell
 
+# Once every package is in: the zone tree tzdata installed becomes the
+# system data vell manages, and the device's programs read through vell's
+# links, the local time being the configured one. The release is the one
+# tzdata's source says (TZDATA_VERSION is "custom" for a source of one's own).
+define VELL_LAY_OUT_TIME_ZONE_DATA
+	$(VELL_DIR)/tools/vell-layout root --release "$$(cat $(TZDATA_DIR)/version)" \
+		--zone $(or $(TZDATA_LOCALTIME),Etc/UTC) $(TARGET_DIR)
+endef
+VELL_TARGET_FINALIZE_HOOKS += VELL_LAY_OUT_TIME_ZONE_DATA
+
 HOST_VELL_CONF_OPTS = -DVELL_BUILD_TESTS=OFF -DVELL_WERROR=OFF -DVELL_INIT=none
 
 # vell-try, and a vell for this host that it runs on the target directory.

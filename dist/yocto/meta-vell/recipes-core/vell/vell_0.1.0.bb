@@ -36,9 +36,9 @@ inherit ${@bb.utils.contains('DISTRO_FEATURES', 'systemd', 'useradd', '', d)}
 USERADD_PACKAGES = "${PN}"
 USERADD_PARAM:${PN} = "--system --no-create-home --home-dir / --shell /sbin/nologin --user-group vell"
 
-# vell-try in a package of its own; as vell-native, it and a vell for the
-# build host, to run on an image's root before it ships.
+# vell-try and vell-layout in a package of their own; as vell-native, they
+# and a vell for the build host, to run on an image's root before it ships.
 PACKAGES =+ "${PN}-try"
-FILES:${PN}-try = "${sbindir}/vell-try"
+FILES:${PN}-try = "${sbindir}/vell-try ${sbindir}/vell-layout"
 RRECOMMENDS:${PN}-try = "${PN}"
 BBCLASSEXTEND = "native"
