@@ -25,12 +25,14 @@ struct fault_point {
 };
 
 // x86-64 and 32-bit ARM have the old path calls beside the *at ones; arm64
-// has only the *at ones (and rmdir is unlinkat there), so labels use those.
+// has only the *at ones (and rmdir is unlinkat there), and 32-bit ARM names
+// its 64-bit stat, seek and truncate calls apart: labels use one name for
+// each, so a sweep reads alike on every architecture.
 std::string at_form(const std::string& call) {
-  static const std::map<std::string, std::string> at = {{"unlink", "unlinkat"},
-                                                        {"rmdir", "unlinkat"},
-                                                        {"symlink", "symlinkat"},
-                                                        {"readlink", "readlinkat"}};
+  static const std::map<std::string, std::string> at = {
+      {"unlink", "unlinkat"},     {"rmdir", "unlinkat"},       {"symlink", "symlinkat"},
+      {"readlink", "readlinkat"}, {"fstatat64", "newfstatat"}, {"fstat64", "fstat"},
+      {"_llseek", "lseek"},       {"ftruncate64", "ftruncate"}};
   const auto found = at.find(call);
   return found == at.end() ? call : found->second;
 }
@@ -40,9 +42,13 @@ std::string at_form(const std::string& call) {
 // calls are not vell's.
 std::vector<fault_point> fault_points(const std::string& vell, const std::string& strace) {
   const int trace = memfd_create("vell-trace", 0);
-  run_start(vell,
-            {strace, "-qq", "-o", "/proc/self/fd/" + std::to_string(trace), "-e",
-             "trace=%file,read,write,close,lseek,fstat,newfstatat,fchdir,getdents64,ftruncate"});
+  // strace's classes, and "?" before a call this architecture may lack.
+  const start_result traced =
+      run_start(vell, {strace, "-qq", "-o", "/proc/self/fd/" + std::to_string(trace), "-e",
+                       "trace=%file,%stat,read,write,close,lseek,?_llseek,fchdir,getdents64,"
+                       "ftruncate,?ftruncate64"});
+  for (const std::string& message : traced.messages)
+    if (message.starts_with("strace: ")) throw vell_try_error(message);
   std::istringstream lines(read_all_and_close(trace));
   std::map<std::string, int> calls, labels;
   std::set<std::string> descriptors;
