@@ -10,6 +10,7 @@
 #include <spawn.h>
 #include <sys/ptrace.h>
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <time.h>
 #include <unistd.h>
@@ -17,12 +18,14 @@
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <fstream>
 #include <map>
 #include <sstream>
 #include <string>
 #include <vector>
 
+#include "platform/syscall_filter.h"
 #include "tools/notation.h"
 #include "tools/sandbox.h"
 
@@ -33,6 +36,12 @@ namespace {
 struct program {
   const char* name;
   std::string path;
+  std::vector<std::string> arguments;
+  std::vector<std::string> command(std::vector<std::string> before = {}) const {
+    before.push_back(path);
+    before.insert(before.end(), arguments.begin(), arguments.end());
+    return before;
+  }
 };
 
 struct start {
@@ -93,9 +102,11 @@ long peak_rss_kib(const program& p, const start& s) {
     const int null_fd = open("/dev/null", O_WRONLY);
     dup2(null_fd, 1);
     dup2(null_fd, 2);
-    char* argv[] = {const_cast<char*>(p.path.c_str()), nullptr};
+    std::vector<char*> argv;
+    for (const std::string& word : p.command()) argv.push_back(strdup(word.c_str()));
+    argv.push_back(nullptr);
     char* envp[] = {nullptr};
-    execve(argv[0], argv, envp);
+    execve(argv[0], argv.data(), envp);
     _exit(127);
   }
   long peak = -1;
@@ -125,7 +136,7 @@ long instructions(const program& p, const start& s, const std::string& scratch) 
   if (!profile_dir.empty())
     out = profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
           std::to_string(s.links.size()) + ".callgrind";
-  run({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out, p.path},
+  run(p.command({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out}),
       scratch.c_str());
   const std::string log = read_file(scratch);
   const size_t at = log.find("Collected : ");
@@ -135,7 +146,7 @@ long instructions(const program& p, const start& s, const std::string& scratch) 
 // System calls before the program first touches the device's paths, and after.
 std::pair<int, int> system_calls(const program& p, const start& s, const std::string& scratch) {
   prepare(s);
-  run({"/usr/bin/strace", "-f", "-o", scratch, p.path});
+  run(p.command({"/usr/bin/strace", "-f", "-o", scratch}));
   std::istringstream trace(read_file(scratch));
   int before = 0, after = 0;
   bool started = false;
@@ -177,10 +188,13 @@ int main(int argc, char** argv) {
   }
   const std::string dir = BENCH_DIR;
   const std::vector<program> programs = {
-      {"vell", vell_path},
-      {"C floor", dir + "/c_floor"},
-      {"library floor, libstdc++", dir + "/library_floor_libstdcxx"},
-      {"library floor, libc++", dir + "/library_floor_libcxx"}};
+      {"vell", vell_path, {}},
+      {"C floor", dir + "/c_floor", {}},
+      {"C floor, confined",
+       dir + "/c_floor_confined",
+       {std::to_string(vell::platform::filter_length())}},
+      {"library floor, libstdc++", dir + "/library_floor_libstdcxx", {}},
+      {"library floor, libc++", dir + "/library_floor_libcxx", {}}};
   const std::string d = "/var/db/timezone/tz/2016d.1.0";
   const std::string localtime =
       "/var/db/timezone/localtime -> /var/db/timezone/zoneinfo/America/Los_Angeles";
@@ -214,7 +228,7 @@ int main(int argc, char** argv) {
       for (const program& p : programs) {
         prepare(s);
         figures& f = results[p.name];
-        f.wall.push_back(run({p.path}));
+        f.wall.push_back(run(p.command()));
       }
     }
     std::printf("\n%s\n  %-26s %14s %12s %22s %10s\n", s.name, "program", "instructions",
@@ -226,13 +240,22 @@ int main(int argc, char** argv) {
     }
     const figures& vell = results["vell"];
     const figures& c_floor = results["C floor"];
+    const figures& confined = results["C floor, confined"];
     const figures& library = std::min(
         results["library floor, libstdc++"], results["library floor, libc++"],
         [](const figures& a, const figures& b) { return a.instructions < b.instructions; });
     std::printf(
-        "  vell / C floor: wall %.2fx    vell / cheaper library floor: instructions %.2fx\n",
-        vell.median_us() / c_floor.median_us(), double(vell.instructions) / library.instructions);
+        "  vell / C floor: wall %.2fx    vell / confined C floor: wall %.2fx    "
+        "vell / cheaper library floor: instructions %.2fx\n",
+        vell.median_us() / c_floor.median_us(), vell.median_us() / confined.median_us(),
+        double(vell.instructions) / library.instructions);
   }
+  // What the build costs in flash.
+  run({"/usr/bin/strip", "-o", scratch, vell_path});
+  struct stat stripped {};
+  stat(scratch_name, &stripped);
+  std::printf("\n%s: %lld bytes stripped\n", vell_path.c_str(),
+              static_cast<long long>(stripped.st_size));
   unlink(scratch_name);
   return 0;
 }

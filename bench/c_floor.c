@@ -1,11 +1,18 @@
 /* The C floor: the file-system calls of a steady start (links and tz_latest
  * name download 2016d.1.0 of the bench device) and nothing else. Each file
- * is read the cheapest way: open, one read, close. */
+ * is read the cheapest way: open, one read, close. Built with CONFINED, it
+ * first confines itself as vell does at the least cost (argv[1]: the length
+ * of vell's filter), so that the two differ only by vell's own work. */
 #include <err.h>
 #include <fcntl.h>
 #include <fts.h>
+#include <stdlib.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+#ifdef CONFINED
+#include "bench/floor_confinement.h"
+#endif
 
 #define DATASET "/var/db/timezone/tz/2016d.1.0"
 
@@ -32,7 +39,16 @@ static void walk(const char* directory) {
   fts_close(fts);
 }
 
-int main(void) {
+int main(int argc, char** argv) {
+#ifdef CONFINED
+  floor_forbid_new_privileges();
+  floor_confine_writes_beneath("/var/db");
+  floor_keep_dac_override();
+  floor_filter(argc > 1 ? atoi(argv[1]) : 0);
+#else
+  (void)argc;
+  (void)argv;
+#endif
   protect("/var/db/timezone/");
   protect("/var/db/timezone/tz/");
   access("/var/db/icutz", F_OK);

@@ -7,10 +7,10 @@
 namespace vell::platform {
 
 /// From now on this process holds no capability but `kept` (a CAP_ number):
-/// the others leave its bounding set (where it may still change that set),
-/// and its effective, permitted, inheritable and so ambient sets. Never
-/// prints, never throws, and leaves errno as it found it; what the process
-/// may not change stays as it was.
+/// the others leave its effective, permitted, inheritable and so ambient
+/// sets. The bounding set stays: under no-new-privileges (set first) no exec
+/// gains what the permitted set lacks. When `kept` is not permitted, none is
+/// kept. Never prints, never throws, and leaves errno as it found it.
 void keep_only_capability(int kept);
 
 }  // namespace vell::platform

@@ -3,7 +3,6 @@
 #include <errno.h>
 #include <fcntl.h>
 #include <linux/landlock.h>
-#include <sys/prctl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -34,8 +33,7 @@ void confine_writes_beneath(const char* dir) {
     const int rules = syscall(SYS_landlock_create_ruleset, &ruleset, sizeof ruleset, 0);
     const landlock_path_beneath_attr rule{.allowed_access = writes, .parent_fd = beneath};
     if (rules >= 0 &&
-        syscall(SYS_landlock_add_rule, rules, LANDLOCK_RULE_PATH_BENEATH, &rule, 0) == 0 &&
-        prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0)
+        syscall(SYS_landlock_add_rule, rules, LANDLOCK_RULE_PATH_BENEATH, &rule, 0) == 0)
       syscall(SYS_landlock_restrict_self, rules, 0);
     if (rules >= 0) close(rules);
     close(beneath);

@@ -8,7 +8,7 @@ namespace vell::platform {
 
 /// From now on this process may create, remove, rename, link, write and
 /// truncate files only beneath the directory `dir`; reading stays as it was.
-/// Sets no-new-privileges, which the kernel asks for first. Uses every write
+/// The kernel asks for no-new-privileges first (or CAP_SYS_ADMIN). Uses every write
 /// right the running kernel's Landlock knows; with no Landlock, or when `dir`
 /// cannot be opened, nothing changes. Never prints, never throws, and leaves
 /// errno as it found it, since every message of a start ends with its text.

@@ -144,21 +144,27 @@ constexpr long denied[] = {
 
 constexpr __u32 new_namespaces = CLONE_NEWNS | CLONE_NEWCGROUP | CLONE_NEWUTS | CLONE_NEWIPC |
                                  CLONE_NEWUSER | CLONE_NEWPID | CLONE_NEWNET;
+// A filter reads arguments a 32-bit word at a time.
+constexpr __u32 low_word = __BYTE_ORDER__ == __ORDER_BIG_ENDIAN__ ? sizeof(__u32) : 0;
 // clone's flags are its first argument; their low word is where the flags are.
-constexpr __u32 clone_flags =
-    offsetof(seccomp_data, args[0]) + (__BYTE_ORDER__ == __ORDER_BIG_ENDIAN__ ? sizeof(__u32) : 0);
+constexpr __u32 clone_flags = offsetof(seccomp_data, args[0]) + low_word;
+
+// prlimit64's third argument points at the new limit, null when it only reads.
+constexpr __u32 new_limit_low = offsetof(seccomp_data, args[2]) + low_word;
+constexpr __u32 new_limit_high = offsetof(seccomp_data, args[2]) + sizeof(__u32) - low_word;
 
 // What the filter does with a call number. clone3 passes its flags in memory
 // that a filter cannot read, so it fails as unknown (a C library then falls
-// back to clone); clone is refused with a flag for a new namespace.
-enum answer : unsigned char { allow, refuse, unknown, check_clone_flags };
+// back to clone); clone is refused with a flag for a new namespace; prlimit64,
+// through which the C library sets limits, is refused a new limit.
+enum answer : unsigned char { allow, refuse, unknown, check_clone_flags, check_new_limit };
 
 // The call numbers as intervals of one answer each, in order: interval i
 // holds the numbers from start[i] up to the next start.
-constexpr size_t call_count = std::size(denied);
+constexpr size_t call_count = std::size(denied) + 3;
 struct interval_table {
-  std::array<__u32, 2 * call_count + 6> start{};
-  std::array<answer, 2 * call_count + 6> says{};
+  std::array<__u32, 2 * call_count + 2> start{};
+  std::array<answer, 2 * call_count + 2> says{};
   size_t count = 0;
   constexpr void add(__u32 from, answer a) {
     if (count > 0 && start[count - 1] == from) --count;  // an empty interval
@@ -172,10 +178,11 @@ constexpr interval_table intervals = [] {
     long number;
     answer says;
   };
-  std::array<call, call_count + 2> calls{};
-  for (size_t i = 0; i < call_count; ++i) calls[i] = {denied[i], refuse};
-  calls[call_count] = {SYS_clone3, unknown};
-  calls[call_count + 1] = {SYS_clone, check_clone_flags};
+  std::array<call, call_count> calls{};
+  for (size_t i = 0; i < std::size(denied); ++i) calls[i] = {denied[i], refuse};
+  calls[call_count - 3] = {SYS_clone3, unknown};
+  calls[call_count - 2] = {SYS_clone, check_clone_flags};
+  calls[call_count - 1] = {SYS_prlimit64, check_new_limit};
   for (size_t i = 1; i < calls.size(); ++i)
     for (size_t j = i; j > 0 && calls[j - 1].number > calls[j].number; --j)
       std::swap(calls[j - 1], calls[j]);
@@ -209,18 +216,20 @@ constexpr size_t search_at = 3;
 constexpr size_t answers_at = search_at + intervals.count - 1;
 constexpr size_t where(answer a) {
   switch (a) {
-    case check_clone_flags:
+    case check_new_limit:
       return answers_at;
-    case refuse:
-      return answers_at + 2;
-    case allow:
-      return answers_at + 3;
-    case unknown:
+    case check_clone_flags:
       return answers_at + 4;
+    case refuse:
+      return answers_at + 6;
+    case allow:
+      return answers_at + 7;
+    case unknown:
+      return answers_at + 8;
   }
   return 0;
 }
-using program_code = std::array<sock_filter, answers_at + 5>;
+using program_code = std::array<sock_filter, answers_at + 9>;
 // Writes the search of intervals low to high (not included) at `at`;
 // returns where it ended.
 constexpr size_t search(program_code& code, size_t at, size_t low, size_t high) {
@@ -240,11 +249,18 @@ constexpr program_code program = [] {
   code[1] = BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, VELL_AUDIT_ARCH, 0, distance(1, where(refuse)));
   code[2] = statement(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr));
   if (search(code, search_at, 0, intervals.count) != answers_at) throw "the search is misplaced";
-  code[answers_at] = statement(BPF_LD | BPF_W | BPF_ABS, clone_flags);
-  code[answers_at + 1] = BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, new_namespaces, 0, 1);
-  code[answers_at + 2] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM);
-  code[answers_at + 3] = statement(BPF_RET | BPF_K, SECCOMP_RET_ALLOW);
-  code[answers_at + 4] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS);
+  const size_t refused = where(refuse), allowed = where(allow);
+  code[answers_at] = statement(BPF_LD | BPF_W | BPF_ABS, new_limit_low);
+  code[answers_at + 1] =
+      BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, 0, 0, distance(answers_at + 1, refused));
+  code[answers_at + 2] = statement(BPF_LD | BPF_W | BPF_ABS, new_limit_high);
+  code[answers_at + 3] = BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, 0, distance(answers_at + 3, allowed),
+                                  distance(answers_at + 3, refused));
+  code[answers_at + 4] = statement(BPF_LD | BPF_W | BPF_ABS, clone_flags);
+  code[answers_at + 5] = BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, new_namespaces, 0, 1);
+  code[refused] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM);
+  code[allowed] = statement(BPF_RET | BPF_K, SECCOMP_RET_ALLOW);
+  code[where(unknown)] = statement(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | ENOSYS);
   return code;
 }();
 #endif
@@ -255,8 +271,16 @@ void deny_unneeded_system_calls() {
 #ifdef VELL_AUDIT_ARCH
   const int saved_errno = errno;
   const sock_fprog bpf{.len = program.size(), .filter = const_cast<sock_filter*>(program.data())};
-  if (prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0) prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &bpf);
+  prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &bpf);
   errno = saved_errno;
+#endif
+}
+
+unsigned filter_length() {
+#ifdef VELL_AUDIT_ARCH
+  return program.size();
+#else
+  return 0;
 #endif
 }
 

@@ -33,10 +33,10 @@ tried() {  # tried [nobody] IMAGE ARG...
 
 # The confinement vell ended boot N with, in BOOTS ("boot N observed NAME
 # VALUE" lines, dev/observe-vell): CAP_DAC_OVERRIDE alone, no new
-# privileges, and a system-call filter.
+# privileges, and a system-call filter; the bounding set is the init's.
 confined() {  # confined BOOTS N
   local pattern
-  for pattern in "CapEff 0000000000000002" "CapPrm 0000000000000002" "CapBnd 0000000000000002" \
+  for pattern in "CapEff 0000000000000002" "CapPrm 0000000000000002" \
     "CapInh 000000000000000[02]" "CapAmb 000000000000000[02]" "NoNewPrivs 1" "Seccomp 2"; do
     grep -qx "boot $2 observed $pattern" <<<"$1" || { echo "not observed: $pattern"; grep "^boot $2 observed" <<<"$1"; return 1; }
   done
