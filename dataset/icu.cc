@@ -7,8 +7,8 @@
 
 #include <cstring>
 #include <memory>
-#include <regex>
 
+#include "dataset/pattern.h"
 #include "fs/path_ops.h"
 #include "fs/paths.h"
 #include "fs/small_files.h"
@@ -25,7 +25,7 @@ vell_icu::vell_icu(const std::string& dataset_path)
 }
 
 void vell_icu::find_schema_in_directory() {
-  static const std::regex pattern("icutz([0-9]+[lbe])\\.dat");  // compiled once per start
+  static const vell_regex pattern("icutz([0-9]+[lbe])\\.dat");  // compiled once per start
   char* const roots[] = {const_cast<char*>(directory_.c_str()), nullptr};
   // Closing the walk, however the loop ends, also returns to the directory it started in.
   const std::unique_ptr<FTS, decltype(&fts_close)> walk(

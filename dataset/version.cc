@@ -2,9 +2,10 @@
 
 #include <err.h>
 
-#include <regex>
 #include <stdexcept>
 #include <tuple>
+
+#include "dataset/pattern.h"
 
 namespace vell {
 
@@ -13,7 +14,7 @@ vell_version::vell_version(const std::string& text) { parse_version(*this, text)
 void parse_version(vell_version& v, const std::string& s) {
   // Compiled once: a start parses up to four versions, and compiling costs
   // more than matching.
-  static const std::regex pattern("([0-9]+)([a-z]+)(?:\\.([0-9]+))?(?:\\.([0-9]+))?");
+  static const vell_regex pattern("([0-9]+)([a-z]+)(?:\\.([0-9]+))?(?:\\.([0-9]+))?");
   try {
     std::smatch results;
     if (!std::regex_match(s, results, pattern) || results.size() != 5) {

@@ -15,6 +15,9 @@ VELL_LICENSE = vell
 VELL_LICENSE_FILES = dist/debian/copyright
 
 VELL_CONF_OPTS = -DVELL_BUILD_TESTS=OFF -DVELL_WERROR=OFF
+ifeq ($(BR2_PACKAGE_VELL_STATIC_LIBSTDCPP),y)
+VELL_CONF_OPTS += -DVELL_STATIC_LIBSTDCXX=ON
+endif
 ifeq ($(BR2_INIT_SYSTEMD),y)
 # The unit's user comes from the users table below, not from sysusers.d.
 VELL_CONF_OPTS += -DVELL_INIT=systemd -DVELL_SYSUSERS_DIR=

@@ -24,6 +24,12 @@ EXTERNALSRC_BUILD = "${WORKDIR}/build"
 VELL_INIT = "${@bb.utils.contains('DISTRO_FEATURES', 'systemd', 'systemd', \
               bb.utils.contains('DISTRO_FEATURES', 'sysvinit', 'sysvinit', 'none', d), d)}"
 VELL_INIT:class-native = "none"
+# libstdc++ and libgcc linked into vell, the C library still shared: a start
+# need not load libstdc++.so, most of what it costs; the binary grows by
+# about 0.9 MB.
+PACKAGECONFIG ??= "static-libstdcxx"
+PACKAGECONFIG:class-native ??= ""
+PACKAGECONFIG[static-libstdcxx] = "-DVELL_STATIC_LIBSTDCXX=ON,-DVELL_STATIC_LIBSTDCXX=OFF"
 EXTRA_OECMAKE = "-DVELL_BUILD_TESTS=OFF -DVELL_WERROR=OFF -DVELL_INIT=${VELL_INIT} \
                  -DVELL_SYSTEMD_UNIT_DIR=${systemd_system_unitdir} -DVELL_SYSUSERS_DIR="
 
