@@ -159,9 +159,16 @@ constexpr __u32 new_limit_high = offsetof(seccomp_data, args[2]) + sizeof(__u32)
 // through which the C library sets limits, is refused a new limit.
 enum answer : unsigned char { allow, refuse, unknown, check_clone_flags, check_new_limit };
 
+struct call {
+  long number;
+  answer says;
+};
+constexpr call checked[] = {
+    {SYS_clone3, unknown}, {SYS_clone, check_clone_flags}, {SYS_prlimit64, check_new_limit}};
+
 // The call numbers as intervals of one answer each, in order: interval i
 // holds the numbers from start[i] up to the next start.
-constexpr size_t call_count = std::size(denied) + 3;
+constexpr size_t call_count = std::size(denied) + std::size(checked);
 struct interval_table {
   std::array<__u32, 2 * call_count + 2> start{};
   std::array<answer, 2 * call_count + 2> says{};
@@ -174,15 +181,9 @@ struct interval_table {
   }
 };
 constexpr interval_table intervals = [] {
-  struct call {
-    long number;
-    answer says;
-  };
   std::array<call, call_count> calls{};
   for (size_t i = 0; i < std::size(denied); ++i) calls[i] = {denied[i], refuse};
-  calls[call_count - 3] = {SYS_clone3, unknown};
-  calls[call_count - 2] = {SYS_clone, check_clone_flags};
-  calls[call_count - 1] = {SYS_prlimit64, check_new_limit};
+  for (size_t i = 0; i < std::size(checked); ++i) calls[std::size(denied) + i] = checked[i];
   for (size_t i = 1; i < calls.size(); ++i)
     for (size_t j = i; j > 0 && calls[j - 1].number > calls[j].number; --j)
       std::swap(calls[j - 1], calls[j]);

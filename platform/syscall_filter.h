@@ -31,9 +31,9 @@ inline constexpr bool filter_keeps_ptrace = false;
 /// new namespaces, keyrings and bpf; and every system call of a foreign
 /// architecture (x32 and i386 on x86-64). A deny-list, so that no library or
 /// error path meets a refusal it did not expect. The kernel asks for
-/// no-new-privileges first (or CAP_SYS_ADMIN). Where the kernel has no seccomp, or on an
-/// architecture vell does not know, nothing changes. Never prints, never
-/// throws, and leaves errno as it found it.
+/// no-new-privileges first (or CAP_SYS_ADMIN). Where the kernel has no
+/// seccomp, or on an architecture vell does not know, nothing changes. Never
+/// prints, never throws, and leaves errno as it found it.
 void deny_unneeded_system_calls();
 
 /// How many instructions that filter has, 0 where there is none: the
