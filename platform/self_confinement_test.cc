@@ -78,6 +78,17 @@ int bounded_child(const std::string& inside, const std::vector<call_case>& calls
       ++mismatches;
     }
 #endif
+#ifdef VELL_AARCH32_PROGRAM
+    // The same for an AArch32 program, which ends by SIGILL when refused.
+    if (const pid_t program = fork(); program == 0) {
+      execl(VELL_AARCH32_PROGRAM, VELL_AARCH32_PROGRAM, nullptr);
+      _exit(127);
+    } else if (int status = 0; waitpid(program, &status, 0) != program || !WIFSIGNALED(status) ||
+                               WTERMSIG(status) != SIGILL) {
+      std::fprintf(stderr, "getpid of an AArch32 program: wait status %d\n", status);
+      ++mismatches;
+    }
+#endif
     if (mismatches) _exit(mismatches);
     for (;;) pause();
   }
