@@ -4,7 +4,7 @@
 // mount namespace over the tests' sample device.
 //   vell_bench [RUNS] [--vell PATH] [--profile DIR]
 // RUNS interleaved timed runs (default 200); --vell measures another build of
-// vell; --profile keeps each program's callgrind file in DIR.
+// vell; --profile keeps each program's callgrind file and trace in DIR.
 #include <fcntl.h>
 #include <signal.h>
 #include <spawn.h>
@@ -21,6 +21,7 @@
 #include <cstring>
 #include <fstream>
 #include <map>
+#include <random>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -127,7 +128,8 @@ long peak_rss_kib(const program& p, const start& s) {
   return peak;
 }
 
-// With --profile DIR, each program's callgrind file is kept there for callgrind_annotate.
+// With --profile DIR, each program's callgrind file (for callgrind_annotate)
+// and system-call trace are kept there.
 std::string profile_dir;
 
 long instructions(const program& p, const start& s, const std::string& scratch) {
@@ -147,6 +149,10 @@ long instructions(const program& p, const start& s, const std::string& scratch) 
 std::pair<int, int> system_calls(const program& p, const start& s, const std::string& scratch) {
   prepare(s);
   run(p.command({"/usr/bin/strace", "-f", "-o", scratch}));
+  if (!profile_dir.empty())
+    std::ofstream(profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
+                  std::to_string(s.links.size()) + ".strace")
+        << read_file(scratch);
   std::istringstream trace(read_file(scratch));
   int before = 0, after = 0;
   bool started = false;
@@ -212,6 +218,16 @@ int main(int argc, char** argv) {
   close(mkstemp(scratch_name));
   const std::string scratch = scratch_name;
 
+  // Each program is read back from the disk, as a boot reads it: a binary
+  // just linked sits in memory as the linker wrote it, which maps otherwise.
+  for (const program& p : programs) {
+    const int fd = open(p.path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0 || fdatasync(fd) != 0 || posix_fadvise(fd, 0, 0, POSIX_FADV_DONTNEED) != 0) {
+      std::perror(p.path.c_str());
+      return 1;
+    }
+    close(fd);
+  }
   vell::sandbox::enter_private_namespace();
   vell::sandbox::vell_device device("", vell::sandbox::sample_device("", ""));
   device.reset();
@@ -224,11 +240,16 @@ int main(int argc, char** argv) {
       results[p.name].calls = system_calls(p, s, scratch);
       results[p.name].rss_kib = peak_rss_kib(p, s);
     }
+    // A new order each round: a program run after a heavier one finds the
+    // caches emptied, and a fixed order would charge that to whoever follows.
+    std::vector<const program*> order;
+    for (const program& p : programs) order.push_back(&p);
+    std::mt19937 shuffler(1);
     for (int i = 0; i < runs; ++i) {
-      for (const program& p : programs) {
+      std::shuffle(order.begin(), order.end(), shuffler);
+      for (const program* p : order) {
         prepare(s);
-        figures& f = results[p.name];
-        f.wall.push_back(run(p.command()));
+        results[p->name].wall.push_back(run(p->command()));
       }
     }
     std::printf("\n%s\n  %-26s %14s %12s %22s %10s\n", s.name, "program", "instructions",
