@@ -1,5 +1,10 @@
 # Sourced by the testing/check-* scripts: checks one at a time, quiet when
-# they hold, and the closing "N passed, N failed" line.
+# they hold, and the closing "N passed, N failed" line; the checkout,
+# $source_dir (unless the script named it); and the script's scratch folder
+# $work, removed at its end unless VELL_KEEP is set.
+source_dir=${source_dir:-$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)}
+work=$(mktemp -d "/tmp/vell-$(basename "$0").XXXXXX") || exit 1
+trap '[ -n "${VELL_KEEP:-}" ] || rm -rf "$work"' EXIT
 passed=0 failed=0
 check() {  # check NAME COMMAND...: one check; on failure, the last of what it printed
   local name=$1 output
