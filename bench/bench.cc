@@ -131,13 +131,14 @@ long peak_rss_kib(const program& p, const start& s) {
 // With --profile DIR, each program's callgrind file (for callgrind_annotate)
 // and system-call trace are kept there.
 std::string profile_dir;
+std::string kept(const program& p, const start& s, const char* kind) {
+  return profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
+         std::to_string(s.links.size()) + "." + kind;
+}
 
 long instructions(const program& p, const start& s, const std::string& scratch) {
   prepare(s);
-  std::string out = "/dev/null";
-  if (!profile_dir.empty())
-    out = profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
-          std::to_string(s.links.size()) + ".callgrind";
+  const std::string out = profile_dir.empty() ? "/dev/null" : kept(p, s, "callgrind");
   run(p.command({"/usr/bin/valgrind", "--tool=callgrind", "--callgrind-out-file=" + out}),
       scratch.c_str());
   const std::string log = read_file(scratch);
@@ -149,10 +150,7 @@ long instructions(const program& p, const start& s, const std::string& scratch) 
 std::pair<int, int> system_calls(const program& p, const start& s, const std::string& scratch) {
   prepare(s);
   run(p.command({"/usr/bin/strace", "-f", "-o", scratch}));
-  if (!profile_dir.empty())
-    std::ofstream(profile_dir + "/" + p.path.substr(p.path.rfind('/') + 1) + "." +
-                  std::to_string(s.links.size()) + ".strace")
-        << read_file(scratch);
+  if (!profile_dir.empty()) std::ofstream(kept(p, s, "strace")) << read_file(scratch);
   std::istringstream trace(read_file(scratch));
   int before = 0, after = 0;
   bool started = false;
