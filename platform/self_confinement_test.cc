@@ -5,7 +5,6 @@
 #include <linux/landlock.h>
 #include <sched.h>
 #include <signal.h>
-#include <sys/mount.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
@@ -38,9 +37,10 @@ struct call_case {
 // A child bounds itself as vell's main does, in its order: its run time
 // (SIGALRM ignored and blocked by its caller), no new privileges, its writes
 // beneath `inside` (after a confinement beneath a missing folder, which must
-// change nothing), its capabilities, its system calls. It tries each call,
-// prints each errno that differs from its case and exits with their count (errno not left as it was
-// counts too); with none it waits, and SIGALRM must end it. Returns the wait status. That only
+// change nothing), its capabilities, its system calls. It tries each call and
+// each call of another ABI, prints each result that differs from its case and
+// exits with their count (errno not left as it was counts too); with none it
+// waits, and SIGALRM must end it. Returns the wait status. That only
 // CAP_DAC_OVERRIDE is left is checked at every boot, on vell's own /proc status.
 int bounded_child(const std::string& inside, const std::vector<call_case>& calls) {
   const pid_t child = fork();

@@ -29,7 +29,7 @@ inline constexpr bool filter_keeps_ptrace = false;
 /// sanitizer, whose check at exit needs it) and performance events, obsolete
 /// calls, resource limits and scheduling, CPU emulation, creating sockets,
 /// new namespaces, keyrings and bpf; and every system call of a foreign
-/// architecture (x32 and i386 on x86-64). A deny-list, so that no library or
+/// architecture (x32 and i386 on x86-64, AArch32 on arm64). A deny-list, so that no library or
 /// error path meets a refusal it did not expect. The kernel asks for
 /// no-new-privileges first (or CAP_SYS_ADMIN). Where the kernel has no
 /// seccomp, or on an architecture vell does not know, nothing changes. Never

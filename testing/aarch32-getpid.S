@@ -1,5 +1,5 @@
-@ A 32-bit ARM program for the filter's architecture check on arm64: it
-@ asks getpid once and ends by SIGILL if refused (-EPERM), by SIGSEGV if not.
+// A 32-bit ARM program for the filter's architecture check on arm64: it
+// asks getpid once and ends by SIGILL if refused (-EPERM), by SIGSEGV if not.
         .arm
         .global _start
 _start:

@@ -26,7 +26,7 @@ VELL_INIT = "${@bb.utils.contains('DISTRO_FEATURES', 'systemd', 'systemd', \
 VELL_INIT:class-native = "none"
 # libstdc++ and libgcc linked into vell, the C library still shared: a start
 # need not load libstdc++.so, most of what it costs; the binary grows by
-# about 0.9 MB.
+# about half a megabyte.
 PACKAGECONFIG ??= "static-libstdcxx"
 PACKAGECONFIG:class-native ??= ""
 PACKAGECONFIG[static-libstdcxx] = "-DVELL_STATIC_LIBSTDCXX=ON,-DVELL_STATIC_LIBSTDCXX=OFF"
